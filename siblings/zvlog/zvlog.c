@@ -1,0 +1,102 @@
+#define _GNU_SOURCE /* strerror_r returning the text */
+#include "zvlog.h"
+
+#include <errno.h>
+#include <stdarg.h>
+#include <stdio.h>
+#include <stdlib.h>
+#include <string.h>
+
+#define ZV_LOG_EXPORT __attribute__((visibility("default")))
+
+static void default_sink(void *context, int32_t level, uint32_t mask, const char *function,
+                         const char *file, int32_t line, const char *message)
+{
+    (void)context;
+    (void)mask;
+    fprintf(stderr, "zvutil[%d] %s (%s:%d): %s\n", (int)level, function ? function : "?",
+            file ? file : "?", (int)line, message);
+}
+
+/* The sink and its context change together, so they are published as one pointer. */
+struct sink_binding {
+    zv_log_sink sink;
+    void *context;
+};
+
+static struct sink_binding default_binding = {default_sink, NULL};
+static struct sink_binding custom_binding;
+static struct sink_binding *_Atomic current = &default_binding;
+
+ZV_LOG_EXPORT void zv_log_set_sink(zv_log_sink sink, void *context)
+{
+    if (sink == NULL) {
+        current = &default_binding;
+        return;
+    }
+    custom_binding.sink = sink;
+    custom_binding.context = context;
+    current = &custom_binding;
+}
+
+static void deliver(int32_t level, uint32_t mask, const char *function, const char *file,
+                    int32_t line, char *message, size_t length)
+{
+    if (length > 0 && message[length - 1] == '\n')
+        message[length - 1] = '\0';
+    struct sink_binding *binding = current;
+    binding->sink(binding->context, level, mask, function, file, line, message);
+}
+
+ZV_LOG_EXPORT void zv_util_log_internal(int32_t level, uint32_t mask, const char *function,
+                                        const char *file, int32_t line, const char *format, ...)
+{
+    int saved = errno;
+    char small[512];
+    char *text = small;
+    va_list args;
+
+    va_start(args, format);
+    int n = vsnprintf(small, sizeof small, format, args);
+    va_end(args);
+    if (n < 0) {
+        small[0] = '\0';
+        n = 0;
+    } else if ((size_t)n >= sizeof small) {
+        char *big = malloc((size_t)n + 1);
+        if (big != NULL) {
+            errno = saved; /* %m must see the caller's errno on the second pass too */
+            va_start(args, format);
+            vsnprintf(big, (size_t)n + 1, format, args);
+            va_end(args);
+            text = big;
+        } else {
+            n = (int)sizeof small - 1;
+        }
+    }
+    deliver(level, mask, function, file, line, text, (size_t)n);
+    if (text != small)
+        free(text);
+    errno = saved;
+}
+
+ZV_LOG_EXPORT void zv_util_log_internal_perror(int32_t errnum, int32_t level, uint32_t mask,
+                                               const char *function, const char *file,
+                                               int32_t line, const char *format)
+{
+    int saved = errno;
+    char reason[256];
+    char text[1024];
+    const char *why = strerror_r(errnum, reason, sizeof reason);
+    const char *body = format ? format : "";
+    size_t length = strlen(body);
+    if (length > 0 && body[length - 1] == '\n')
+        length--;
+    int n = snprintf(text, sizeof text, "%.*s: %s", (int)length, body, why);
+    if (n < 0)
+        n = 0;
+    if ((size_t)n >= sizeof text)
+        n = (int)sizeof text - 1;
+    deliver(level, mask, function, file, line, text, 0);
+    errno = saved;
+}

@@ -1,0 +1,121 @@
+// Library-internal helpers shared by every family: the failure convention,
+// owning handles and small utilities. Nothing here is exported.
+#pragma once
+
+#include <zverrortrace.h>
+#include <zvlog.h>
+#include <zvutil/status.h>
+
+#include <cerrno>
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <memory>
+#include <unistd.h>
+
+#define ZV_INTERNAL __attribute__((visibility("hidden")))
+
+namespace zv {
+
+inline constexpr int32_t kLogError = 3;
+inline constexpr int32_t kLogNote = 7;
+inline constexpr uint32_t kLogMask = 128;
+
+// Records one trace frame and yields |status|, so that a failure path reads as
+// `return ZV_FAIL(...)`.
+[[gnu::cold]] inline zv_status record_frame(zv_status status, const char *function,
+                                            const char *file, int32_t line)
+{
+    zv_trace_save(function, file, line, status);
+    return status;
+}
+
+inline void set_errno_out(int32_t *errno_out, int value)
+{
+    if (errno_out != nullptr)
+        *errno_out = value;
+}
+
+struct FreeDeleter {
+    void operator()(void *block) const noexcept { std::free(block); }
+};
+template <class T>
+using unique_malloc = std::unique_ptr<T, FreeDeleter>;
+
+struct FileCloser {
+    void operator()(FILE *stream) const noexcept { std::fclose(stream); }
+};
+using unique_file = std::unique_ptr<FILE, FileCloser>;
+
+// Owns a descriptor; closing on the way out keeps errno as the failure left it.
+class unique_fd {
+public:
+    unique_fd() = default;
+    explicit unique_fd(int fd) : fd_(fd) {}
+    unique_fd(const unique_fd &) = delete;
+    unique_fd &operator=(const unique_fd &) = delete;
+    unique_fd(unique_fd &&other) noexcept : fd_(other.release()) {}
+    unique_fd &operator=(unique_fd &&other) noexcept
+    {
+        reset(other.release());
+        return *this;
+    }
+    ~unique_fd() { reset(); }
+
+    int get() const { return fd_; }
+    explicit operator bool() const { return fd_ >= 0; }
+    int release()
+    {
+        int fd = fd_;
+        fd_ = -1;
+        return fd;
+    }
+    void reset(int fd = -1)
+    {
+        if (fd_ >= 0) {
+            int saved = errno;
+            ::close(fd_);
+            errno = saved;
+        }
+        fd_ = fd;
+    }
+
+private:
+    int fd_ = -1;
+};
+
+}  // namespace zv
+
+// The source-file constant: __FILE__ is made relative to the repository by
+// -fmacro-prefix-map, so no build machine's path reaches a frame.
+#define ZV_SOURCE_FILE __FILE__
+
+// Records a frame for the enclosing function and yields |status|.
+#define ZV_FAIL(status) ::zv::record_frame((status), __func__, ZV_SOURCE_FILE, __LINE__)
+
+// A failure the function detects itself: log line (level 3) first, then frame.
+#define ZV_LOG_FAIL(status, ...)                                                          \
+    (zv_util_log_internal(::zv::kLogError, ::zv::kLogMask, __func__, ZV_SOURCE_FILE,      \
+                          __LINE__, __VA_ARGS__),                                         \
+     ZV_FAIL(status))
+
+// As ZV_LOG_FAIL, with the text of the saved |errnum| appended by the logger.
+#define ZV_PERROR_FAIL(errnum, status, format)                                            \
+    (zv_util_log_internal_perror((errnum), ::zv::kLogError, ::zv::kLogMask, __func__,     \
+                                 ZV_SOURCE_FILE, __LINE__, (format)),                     \
+     ZV_FAIL(status))
+
+// A callee's failure passed on: own frame first, then the log line.
+#define ZV_FAIL_THEN_LOG(status, ...)                                                     \
+    ((void)ZV_FAIL(status),                                                               \
+     zv_util_log_internal(::zv::kLogError, ::zv::kLogMask, __func__, ZV_SOURCE_FILE,      \
+                          __LINE__, __VA_ARGS__),                                         \
+     (status))
+
+// Plain log lines, for paths that go on or that record no frame.
+#define ZV_LOG(level, ...)                                                                \
+    zv_util_log_internal((level), ::zv::kLogMask, __func__, ZV_SOURCE_FILE, __LINE__,     \
+                         __VA_ARGS__)
+#define ZV_LOG_PERROR(errnum, format)                                                     \
+    zv_util_log_internal_perror((errnum), ::zv::kLogError, ::zv::kLogMask, __func__,      \
+                                ZV_SOURCE_FILE, __LINE__, (format))

@@ -1,0 +1,29 @@
+// Measuring formatted text, and the formatting routine the allocator uses.
+#include <zvutil/format.h>
+
+#include "string/format_internal.h"
+
+extern "C" {
+
+ZV_EXPORT zv_status zv_util_printf_vsize(const char *format, va_list args, uint32_t *size_out)
+{
+    if (format == nullptr || size_out == nullptr)
+        return ZV_FAIL(ZV_ERR_NULL_ARG);
+    char scratch[1];
+    int n = std::vsnprintf(scratch, 0, format, args);
+    if (n < 0)
+        return ZV_FAIL(ZV_ERR_SYSTEM);
+    *size_out = static_cast<uint32_t>(n) + 1u;
+    return ZV_OK;
+}
+
+}  // extern "C"
+
+namespace zv {
+
+int format_into(char *buffer, uint32_t size, const char *format, va_list args)
+{
+    return std::vsnprintf(buffer, size, format, args);
+}
+
+}  // namespace zv
