@@ -1,8 +1,11 @@
-// Splitting, joining and appending strings.
+// Splitting, joining and appending strings, and hexadecimal byte text.
+#include <zvutil/hex.h>
 #include <zvutil/string_ops.h>
 
+#include <array>
 #include <cstring>
 
+#include "hex_pairs.h"
 #include "internal.h"
 
 namespace {
@@ -48,6 +51,20 @@ zv_status measure_join(const char *const *strings, uint32_t count, size_t m, uin
     *total = sum;
     return ZV_OK;
 }
+
+// Nibble value of each hexadecimal digit; kNotHex for every other character.
+constexpr uint8_t kNotHex = 0x80;
+constexpr auto kNibbles = [] {
+    std::array<uint8_t, 256> nibbles{};
+    nibbles.fill(kNotHex);
+    for (uint8_t v = 0; v < 10; v++)
+        nibbles['0' + v] = v;
+    for (uint8_t v = 0; v < 6; v++) {
+        nibbles['a' + v] = static_cast<uint8_t>(10 + v);
+        nibbles['A' + v] = static_cast<uint8_t>(10 + v);
+    }
+    return nibbles;
+}();
 
 }  // namespace
 
@@ -164,6 +181,36 @@ ZV_EXPORT zv_status zv_util_append_string(char **buffer, uint32_t *length, const
     std::free(*buffer);
     *buffer = grown;
     *length = new_length;
+    return ZV_OK;
+}
+
+ZV_EXPORT zv_status zv_util_sprintf_bytes(const void *bytes, uint32_t n, char **out)
+{
+    // From 2^31 bytes on, 2 * n + 1 does not fit 32 bits.
+    auto *text = n < 0x80000000u ? static_cast<char *>(std::malloc(2 * n + 1)) : nullptr;
+    *out = text;
+    if (text == nullptr)
+        return ZV_LOG_FAIL(ZV_ERR_NO_MEMORY, "Allocation failed\n");
+    zv::put_hex_pairs(text, static_cast<const uint8_t *>(bytes), n);
+    text[2 * n] = '\0';
+    return ZV_OK;
+}
+
+ZV_EXPORT zv_status zv_util_sscanf_bytes(const char *text, uint32_t length, uint8_t **out)
+{
+    uint32_t k = length / 2;
+    zv::unique_malloc<uint8_t> bytes(static_cast<uint8_t *>(std::malloc(k)));
+    *out = nullptr;
+    if (!bytes)
+        return ZV_LOG_FAIL(ZV_ERR_NO_MEMORY, "Allocation failed\n");
+    const auto *digits = reinterpret_cast<const unsigned char *>(text);
+    for (uint32_t i = 0; i < k; i++) {
+        uint8_t high = kNibbles[digits[2 * i]], low = kNibbles[digits[2 * i + 1]];
+        if (((high | low) & kNotHex) != 0)
+            return ZV_FAIL(ZV_ERR_BAD_VALUE);
+        bytes.get()[i] = static_cast<uint8_t>(high << 4 | low);
+    }
+    *out = bytes.release();
     return ZV_OK;
 }
 
