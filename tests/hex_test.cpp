@@ -101,7 +101,7 @@ TEST(HexText, AllocationFailureIsLogged)
 
 TEST(HexPrint, WritesPairsAndIgnoresStreamErrors)
 {
-    std::string bytes = every_byte() + every_byte() + every_byte();  // several chunks
+    std::string bytes = every_byte() + "\x5a" + every_byte() + every_byte();  // several chunks
     char *buffer = nullptr;
     size_t size = 0;
     FILE *stream = open_memstream(&buffer, &size);
