@@ -2,7 +2,6 @@
 #include <gtest/gtest.h>
 
 #include <cerrno>
-#include <cstdlib>
 #include <string>
 #include <vector>
 
@@ -12,194 +11,111 @@
 
 namespace {
 
-// A parse over one table of flag, string and integer options.
+const std::string k300(300, 'x'), k301(301, 'x');
+
+// Flag, string and integer options; -f is a flag that wants a value, -h a
+// record without a handler.
 struct Parse {
-    int32_t verbose = 0;
-    int32_t number = -1;
+    int32_t verbose = 0, number = -1, shadowed = 0;
     char *output = nullptr;
-    int32_t shadowed = 0;
-    zv_util_option table[4] = {
+    const zv_util_option table[6] = {
         {'v', "verbose", zv_util_getopt_flag, &verbose, 0},
         {'o', "output", zv_util_getopt_string, &output, 1},
         {'n', "count", zv_util_getopt_int, &number, 1},
         {'v', "verbose", zv_util_getopt_flag, &shadowed, 0},  // first match wins
+        {'f', "", zv_util_getopt_flag, &shadowed, 1},
+        {'h', "", nullptr, &shadowed, 0},
     };
-
     ~Parse() { std::free(output); }
-    zv_status run(std::vector<const char *> args, int32_t start = 1)
+    zv_status run(const std::vector<const char *> &args, int32_t start = 1)
     {
-        return zv_util_getopt_from(static_cast<int32_t>(args.size()),
-                                   const_cast<char *const *>(args.data()), table, 4, start);
+        auto *argv = const_cast<char *const *>(args.data());
+        return zv_util_getopt_from(static_cast<int32_t>(args.size()), argv, table, 6, start);
     }
-    std::string text() const { return output != nullptr ? output : "(null)"; }
+    std::string text() const { return output != nullptr ? output : "-"; }
 };
 
 TEST(Getopt, MatchesShortAndLongForms)
 {
-    struct Row {
+    const struct {
         std::vector<const char *> args;
-        int32_t verbose;
-        const char *output;
-        int32_t number;
+        int32_t start, verbose, number;
+        std::string output;
     } rows[] = {
-        {{"prog"}, 0, "(null)", -1},
-        {{"prog", "-v"}, 1, "(null)", -1},
-        {{"prog", "/v"}, 1, "(null)", -1},
-        {{"prog", "--verbose", "-verbose", "/verbose"}, 1, "(null)", -1},
-        {{"prog", "--Verbose", "--verb", "-vo", "-", "/", "v", "--"}, 0, "(null)", -1},
-        {{"prog", "-z", "--zzz", "--output", "x"}, 0, "x", -1},
-        {{"prog", "-o", "-v", "/count", "0"}, 0, "-v", 0},  // values are taken unchanged
-        {{"prog", "-n", " -42"}, 0, "(null)", -42},
-        {{"prog", "-n", "12abc", "-n", "+7"}, 0, "(null)", 7},
-        {{"prog", "-n", "2147483647"}, 0, "(null)", INT32_MAX},
-        {{"prog", "-n", "-2147483648"}, 0, "(null)", INT32_MIN},
+        {{"-v"}, 1, 0, -1, "-"},
+        {{"-v"}, 0, 1, -1, "-"},
+        {{"prog", "/v"}, 1, 1, -1, "-"},
+        {{"prog", "--verbose", "-verbose", "/verbose"}, 1, 1, -1, "-"},
+        {{"prog", "--Verbose", "--verb", "-vo", "-", "/", "v", "-z", "--zzz"}, 1, 0, -1, "-"},
+        {{"prog", "--output", k300.c_str(), "-n", " -42"}, 1, 0, -42, k300},
+        {{"prog", "-o", "-v", "/count", "12abc"}, 1, 0, 12, "-v"},  // values taken unchanged
+        {{"prog", "-n", "2147483647", "-n", "-2147483648"}, 1, 0, INT32_MIN, "-"},
     };
-    for (const Row &row : rows) {
+    for (const auto &row : rows) {
         Parse parse;
-        EXPECT_STATUS(ZV_OK, parse.run(row.args)) << row.args.size();
-        EXPECT_EQ(parse.verbose, row.verbose) << row.args[1];
-        EXPECT_EQ(parse.text(), row.output) << row.args.size();
-        EXPECT_EQ(parse.number, row.number) << row.args.size();
+        EXPECT_EQ(parse.run(row.args, row.start), ZV_OK);
+        EXPECT_EQ(parse.verbose, row.verbose) << row.args.back();
+        EXPECT_EQ(parse.number, row.number) << row.args.back();
+        EXPECT_EQ(parse.text(), row.output);
         EXPECT_EQ(parse.shadowed, 0);
     }
     EXPECT_NO_FRAMES();
 }
 
-TEST(Getopt, StartIndexDecidesWhetherTheProgramNameCounts)
+TEST(Getopt, FailedOptionStopsTheParse)
 {
-    Parse from_zero, from_one;
-    EXPECT_STATUS(ZV_OK, from_zero.run({"-v"}, 0));
-    EXPECT_EQ(from_zero.verbose, 1);
-    char arg0[] = "-v";
-    char *argv[] = {arg0};
-    EXPECT_STATUS(ZV_OK, zv_util_getopt(1, argv, from_one.table, 4));
-    EXPECT_EQ(from_one.verbose, 0);
-}
-
-int32_t custom_calls;
-zv_status count_value(const zv_util_option *, const char *value, uint32_t *consumed)
-{
-    custom_calls += value != nullptr;
-    *consumed = 9;  // ignored: the record fixes the step
-    return ZV_OK;
-}
-
-TEST(Getopt, StepComesFromTheRecordNotTheHandler)
-{
-    int32_t verbose = 0;
-    const zv_util_option table[] = {{'c', "", count_value, nullptr, 1},
-                                    {'v', "", zv_util_getopt_flag, &verbose, 0}};
-    const char *args[] = {"prog", "-c", "x", "-v"};
-    custom_calls = 0;
-    EXPECT_STATUS(ZV_OK, zv_util_getopt(4, const_cast<char *const *>(args), table, 2));
-    EXPECT_EQ(custom_calls, 1);
-    EXPECT_EQ(verbose, 1);
-}
-
-TEST(Getopt, FailedOptionStopsTheParseWithFourFrames)
-{
-    struct Row {
+    const struct {
         std::vector<const char *> args;
         zv_status status;
-        const char *handler;  // nullptr: process_option detects it
-        const char *output;
+        const char *handler;  // nullptr: process_option found the fault
+        std::string output;
     } rows[] = {
         {{"prog", "-o", "a", "-o", "b"}, ZV_ERR_BAD_VALUE, "zv_util_getopt_string", "a"},
-        {{"prog", "-n", "abc", "-o", "x"}, ZV_ERR_BAD_VALUE, "zv_util_getopt_int", "(null)"},
-        {{"prog", "-n", "2147483648"}, ZV_ERR_BAD_VALUE, "zv_util_getopt_int", "(null)"},
-        {{"prog", "-f", "x"}, ZV_ERR_BAD_VALUE, "zv_util_getopt_flag", "(null)"},
-        {{"prog", "-d", "x"}, ZV_ERR_NULL_ARG, "zv_util_getopt_string", "(null)"},
-        {{"prog", "-h"}, ZV_ERR_NULL_ARG, nullptr, "(null)"},
+        {{"prog", "-o", k301.c_str()}, ZV_ERR_BAD_VALUE, "zv_util_getopt_string", "-"},
+        {{"prog", "-o", "a"}, ZV_ERR_NO_MEMORY, "zv_util_getopt_string", "-"},
+        {{"prog", "-n", "abc", "-o", "x"}, ZV_ERR_BAD_VALUE, "zv_util_getopt_int", "-"},
+        {{"prog", "-n", "2147483648"}, ZV_ERR_BAD_VALUE, "zv_util_getopt_int", "-"},
+        {{"prog", "-f", "x"}, ZV_ERR_BAD_VALUE, "zv_util_getopt_flag", "-"},
+        {{"prog", "-h"}, ZV_ERR_NULL_ARG, nullptr, "-"},
+        {{"prog", "-o", "a", "--count"}, ZV_ERR_SYSTEM, nullptr, "a"},
     };
-    for (const Row &row : rows) {
+    for (const auto &row : rows) {
         Parse parse;
-        int32_t flag = 0;
-        // -f: a flag record that wants a value; -d: no destination; -h: no handler.
-        const zv_util_option table[] = {parse.table[1], parse.table[2],
-                                        {'f', "", zv_util_getopt_flag, &flag, 1},
-                                        {'d', "", zv_util_getopt_string, nullptr, 1},
-                                        {'h', "", nullptr, &flag, 0}};
         zvt::clear_trace();
-        zv_status status = zv_util_getopt(static_cast<int32_t>(row.args.size()),
-                                          const_cast<char *const *>(row.args.data()), table, 5);
-        EXPECT_STATUS(row.status, status) << row.args[1];
+        zvt::LogCapture log;
+        if (row.status == ZV_ERR_NO_MEMORY)
+            zvt::fault_arm("alloc", 1, ENOMEM);
+        EXPECT_EQ(parse.run(row.args), row.status) << row.args[1];
+        zvt::fault_clear();
+        std::vector<std::string> expected = {"process_option", "zv_util_getopt_from",
+                                             "zv_util_getopt_from"}, functions;
         if (row.handler != nullptr)
-            EXPECT_FRAMES({row.handler, row.status}, {"process_option", row.status},
-                          {"zv_util_getopt_from", row.status}, {"zv_util_getopt_from", row.status});
-        else
-            EXPECT_FRAMES({"process_option", row.status}, {"zv_util_getopt_from", row.status},
-                          {"zv_util_getopt_from", row.status});
+            expected.insert(expected.begin(), row.handler);
+        for (const zvt::Frame &frame : zvt::frames()) {
+            functions.push_back(frame.function);
+            EXPECT_EQ(frame.status, row.status);
+        }
+        EXPECT_EQ(functions, expected);
         EXPECT_EQ(parse.text(), row.output);
-        EXPECT_EQ(flag, 0);
+        EXPECT_EQ(parse.number + parse.shadowed, -1);
+        const bool missing = row.status == ZV_ERR_SYSTEM;  // logged before the first frame
+        EXPECT_EQ(static_cast<bool>(zvt::LogIs(log, {{3, "Missing mandatory option"}})), missing);
+        EXPECT_TRUE(!missing || log.lines().at(0).frames_before == 0);
     }
-}
-
-TEST(Getopt, ValueOptionAsLastArgumentIsMissing)
-{
-    Parse parse;
-    zvt::LogCapture log;
-    EXPECT_STATUS(ZV_ERR_SYSTEM, parse.run({"prog", "-v", "--count"}));
-    EXPECT_EQ(parse.verbose, 1);  // options before the failure are stored
-    EXPECT_FRAMES({"process_option", ZV_ERR_SYSTEM}, {"zv_util_getopt_from", ZV_ERR_SYSTEM},
-                  {"zv_util_getopt_from", ZV_ERR_SYSTEM});
-    ASSERT_TRUE(zvt::LogIs(log, {{3, "Missing mandatory option"}}));
-    EXPECT_EQ(log.lines()[0].frames_before, 0u);
 }
 
 TEST(Getopt, ArgumentChecks)
 {
     Parse parse;
     char *argv[] = {nullptr};
-    struct Row {
-        zv_status status;
-        zv_status expected;
-        const char *function;
-    } rows[] = {
-        {zv_util_getopt(1, nullptr, parse.table, 4), ZV_ERR_NULL_ARG, "zv_util_getopt"},
-        {zv_util_getopt(1, argv, nullptr, 4), ZV_ERR_NULL_ARG, "zv_util_getopt"},
-        {zv_util_getopt(0, argv, parse.table, 4), ZV_ERR_BAD_VALUE, "zv_util_getopt"},
-        {zv_util_getopt(1, argv, parse.table, 0), ZV_ERR_BAD_VALUE, "zv_util_getopt"},
-        {zv_util_getopt_from(1, nullptr, parse.table, 4, 0), ZV_ERR_NULL_ARG, "zv_util_getopt_from"},
-        {zv_util_getopt_from(1, argv, parse.table, 4, -1), ZV_ERR_BAD_VALUE, "zv_util_getopt_from"},
-        {zv_util_getopt_from(1, argv, parse.table, -1, 0), ZV_ERR_BAD_VALUE, "zv_util_getopt_from"},
-    };
-    std::vector<zvt::Frame> frames = zvt::frames();
-    ASSERT_EQ(frames.size(), std::size(rows));
-    for (size_t k = 0; k < std::size(rows); ++k) {
-        EXPECT_STATUS(rows[k].expected, rows[k].status) << k;
-        EXPECT_EQ(frames[k].function, rows[k].function) << k;
-        EXPECT_STATUS(rows[k].expected, frames[k].status) << k;
-    }
-}
-
-TEST(GetoptString, LengthLimitIsThreeHundred)
-{
-    std::string longest(300, 'x'), too_long(301, 'x');
-    Parse parse;
-    uint32_t consumed = 0;
-    EXPECT_STATUS(ZV_OK, zv_util_getopt_string(&parse.table[1], longest.c_str(), &consumed));
-    EXPECT_EQ(parse.text(), longest);
-    EXPECT_EQ(consumed, 2u);
-    Parse again;
-    EXPECT_STATUS(ZV_ERR_BAD_VALUE, zv_util_getopt_string(&again.table[1], too_long.c_str(), &consumed));
-    EXPECT_EQ(again.output, nullptr);
-    EXPECT_STATUS(ZV_ERR_BAD_VALUE, zv_util_getopt_int(&again.table[2], too_long.c_str(), &consumed));
-    EXPECT_FRAMES({"zv_util_getopt_string", ZV_ERR_BAD_VALUE}, {"zv_util_getopt_int", ZV_ERR_BAD_VALUE});
-}
-
-TEST(GetoptString, AllocationFailureReachesTheParse)
-{
-    zvt::sweep_allocations(
-        [] {
-            Parse parse;
-            return parse.run({"prog", "-o", "x"}) == ZV_OK;
-        },
-        [](unsigned) {
-            EXPECT_FRAMES({"zv_util_getopt_string", ZV_ERR_NO_MEMORY},
-                          {"process_option", ZV_ERR_NO_MEMORY},
-                          {"zv_util_getopt_from", ZV_ERR_NO_MEMORY},
-                          {"zv_util_getopt_from", ZV_ERR_NO_MEMORY});
-        });
+    EXPECT_EQ(zv_util_getopt(1, nullptr, parse.table, 1), ZV_ERR_NULL_ARG);
+    EXPECT_EQ(zv_util_getopt(0, argv, parse.table, 1), ZV_ERR_BAD_VALUE);
+    EXPECT_EQ(zv_util_getopt(1, argv, parse.table, 0), ZV_ERR_BAD_VALUE);
+    EXPECT_EQ(zv_util_getopt_from(1, argv, nullptr, 1, 0), ZV_ERR_NULL_ARG);
+    EXPECT_EQ(zv_util_getopt_from(1, argv, parse.table, 1, -1), ZV_ERR_BAD_VALUE);
+    EXPECT_FRAMES({"zv_util_getopt", ZV_ERR_NULL_ARG}, {"zv_util_getopt", ZV_ERR_BAD_VALUE},
+                  {"zv_util_getopt", ZV_ERR_BAD_VALUE}, {"zv_util_getopt_from", ZV_ERR_NULL_ARG},
+                  {"zv_util_getopt_from", ZV_ERR_BAD_VALUE});
 }
 
 }  // namespace
