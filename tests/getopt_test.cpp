@@ -30,7 +30,9 @@ struct Parse {
     zv_status run(const std::vector<const char *> &args, int32_t start = 1)
     {
         auto *argv = const_cast<char *const *>(args.data());
-        return zv_util_getopt_from(static_cast<int32_t>(args.size()), argv, table, 6, start);
+        const auto argc = static_cast<int32_t>(args.size());
+        return start == 1 ? zv_util_getopt(argc, argv, table, 6)  // adds no frame of its own
+                          : zv_util_getopt_from(argc, argv, table, 6, start);
     }
     std::string text() const { return output != nullptr ? output : "-"; }
 };
