@@ -31,16 +31,12 @@ int __real_fsync(int fd);
 int __real_fstat64(int fd, struct stat64 *st);
 int __real_stat64(const char *path, struct stat64 *st);
 off_t __real_lseek(int fd, off_t offset, int whence);
-int __real_truncate(const char *path, off_t length);
-int __real_unlink(const char *path);
 FILE *__real_fopen(const char *path, const char *mode);
 size_t __real_fwrite(const void *data, size_t size, size_t count, FILE *stream);
 size_t __real_fread(void *data, size_t size, size_t count, FILE *stream);
 int __real_fflush(FILE *stream);
 int __real_ferror(FILE *stream);
 int __real_fileno(FILE *stream);
-char *__real_realpath(const char *path, char *resolved);
-int __real_mkdir(const char *path, mode_t mode);
 DIR *__real_opendir(const char *path);
 int __real_scandir64(const char *path, struct dirent64 ***list,
                      int (*filter)(const struct dirent64 *),
@@ -53,7 +49,7 @@ long __real_sysconf(int name);
 int __wrap_open(const char *path, int flags, ...)
 {
     mode_t mode = 0;
-    if ((flags & (O_CREAT | O_TMPFILE)) != 0) {
+    if ((flags & O_CREAT) != 0 || (flags & O_TMPFILE) == O_TMPFILE) {
         va_list args;
         va_start(args, flags);
         mode = static_cast<mode_t>(va_arg(args, unsigned));
@@ -108,16 +104,6 @@ off_t __wrap_lseek(int fd, off_t offset, int whence)
     return zvt::fault_hit("lseek") ? -1 : __real_lseek(fd, offset, whence);
 }
 
-int __wrap_truncate(const char *path, off_t length)
-{
-    return zvt::fault_hit("truncate") ? -1 : __real_truncate(path, length);
-}
-
-int __wrap_unlink(const char *path)
-{
-    return zvt::fault_hit("unlink") ? -1 : __real_unlink(path);
-}
-
 FILE *__wrap_fopen(const char *path, const char *mode)
 {
     return zvt::fault_hit("fopen") ? nullptr : __real_fopen(path, mode);
@@ -140,16 +126,6 @@ int __wrap_fflush(FILE *stream) { return zvt::fault_hit("fflush") ? EOF : __real
 int __wrap_ferror(FILE *stream) { return zvt::fault_hit("ferror") ? 1 : __real_ferror(stream); }
 
 int __wrap_fileno(FILE *stream) { return zvt::fault_hit("fileno") ? -1 : __real_fileno(stream); }
-
-char *__wrap_realpath(const char *path, char *resolved)
-{
-    return zvt::fault_hit("realpath") ? nullptr : __real_realpath(path, resolved);
-}
-
-int __wrap_mkdir(const char *path, mode_t mode)
-{
-    return zvt::fault_hit("mkdir") ? -1 : __real_mkdir(path, mode);
-}
 
 DIR *__wrap_opendir(const char *path)
 {
