@@ -10,6 +10,7 @@
 
 #include "file/file_internal.h"
 #include "hex_pairs.h"
+
 extern "C" {
 
 ZV_EXPORT zv_status zv_util_fopen(FILE **stream_out, int32_t *errno_out, const char *mode,
