@@ -22,6 +22,6 @@ void BM_Hash64(benchmark::State &state)
     }
     state.SetBytesProcessed(static_cast<int64_t>(state.iterations()) * length);
 }
-BENCHMARK(BM_Hash64)->Arg(64)->Arg(4 << 10)->Arg(1 << 20);
+BENCHMARK(BM_Hash64)->Name("hash64/zvutil")->Arg(64)->Arg(4 << 10)->Arg(1 << 20);
 
 }  // namespace

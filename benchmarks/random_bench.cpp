@@ -21,6 +21,6 @@ void BM_PrngFill(benchmark::State &state)
     }
     state.SetBytesProcessed(static_cast<int64_t>(state.iterations()) * length);
 }
-BENCHMARK(BM_PrngFill)->Arg(4 << 10)->Arg(1 << 20);
+BENCHMARK(BM_PrngFill)->Name("prng_fill/zvutil")->Arg(4 << 10)->Arg(1 << 20);
 
 }  // namespace
