@@ -5,7 +5,9 @@
 #include <cmath>
 #include <cstdlib>
 #include <cstring>
+#include <fstream>
 #include <functional>
+#include <sstream>
 #include <string>
 #include <unistd.h>
 
@@ -387,6 +389,29 @@ TEST(Clock, ReadingsAndElapsedSeconds)
     uint64_t cycles = zv_util_read_cycles();
     usleep(1000);
     EXPECT_GT(zv_util_read_cycles(), cycles);
+}
+
+// The public header refuses an i386 caller that builds with 64-bit time_t.
+TEST(TimeHeader, RefusesI386CallersWith64BitTime)
+{
+    char dir[] = "/tmp/zvutil-time-XXXXXX";
+    ASSERT_NE(mkdtemp(dir), nullptr);
+    std::string probe = std::string(dir) + "/probe.c", errors = std::string(dir) + "/errors";
+    std::ofstream(probe) << "#include <zvutil/timeutil.h>\nint main(void) { return 0; }\n";
+    auto compile = [&](const std::string &flags) {
+        std::string command = "cc -m32 -std=c99 -pedantic -Werror -fsyntax-only -I" ZVT_SOURCE_DIR
+                              "/include " + flags + " " + probe + " 2>" + errors;
+        return std::system(command.c_str());
+    };
+    bool compiler = compile("") == 0;
+    int refused = compiler ? compile("-D_FILE_OFFSET_BITS=64 -D_TIME_BITS=64") : 0;
+    std::stringstream message;
+    message << std::ifstream(errors).rdbuf();
+    std::system(("rm -rf " + std::string(dir)).c_str());
+    if (!compiler)
+        GTEST_SKIP() << "no 32-bit C compiler: " << message.str();
+    EXPECT_NE(refused, 0);
+    EXPECT_NE(message.str().find("build without _TIME_BITS=64"), std::string::npos) << message.str();
 }
 
 }  // namespace
