@@ -5,10 +5,10 @@
 #include <ctime>
 
 #include "internal.h"
-#include "time/double_arith.h"
+#include "double_arith.h"
 
 namespace {
-namespace dbl = zv::time_double;
+namespace dbl = zv::exact_double;
 }
 
 extern "C" {

@@ -7,11 +7,11 @@
 #include <sys/time.h>
 
 #include "internal.h"
-#include "time/double_arith.h"
+#include "double_arith.h"
 
 namespace {
 
-namespace dbl = zv::time_double;
+namespace dbl = zv::exact_double;
 
 constexpr int64_t kMaxSecond = 0x7FFFFFFF;
 

@@ -6,12 +6,13 @@
 // altogether. Each operation here is done with the x87 precision control set
 // to 53 bits and its result stored as a double, so it rounds exactly once, as
 // SSE2 does. (The x87 exponent range stays wider, which only matters for
-// results in the subnormal range; none of the callers comes near it.)
+// products and quotients in the subnormal range; sums and differences that
+// land there are exact anyway.)
 #pragma once
 
 #include <cstdint>
 
-namespace zv::time_double {
+namespace zv::exact_double {
 
 #if defined(__i386__) && !defined(__SSE2_MATH__)
 
@@ -75,4 +76,4 @@ inline double divide(double a, double b)
     return round_once(a, b, [](double x, double y) { return x / y; });
 }
 
-}  // namespace zv::time_double
+}  // namespace zv::exact_double
