@@ -1,0 +1,139 @@
+// Scratch directories, forked children and a failure-table driver for the
+// file, directory and group tests.
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <grp.h>
+#include <sstream>
+#include <string>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include "support/fault.h"
+#include "support/trace.h"
+
+namespace zvt {
+
+// The unprivileged user and group that permission cases run as.
+inline constexpr uid_t kNobody = 65534;
+inline constexpr gid_t kNogroup = 65534;
+
+// A fresh directory under /tmp, owned by the unprivileged user so a dropped
+// child can work in it; removed with its content at the end.
+class ScratchDir {
+public:
+    ScratchDir()
+    {
+        char pattern[] = "/tmp/zvutil-test-XXXXXX";
+        path_ = mkdtemp(pattern);
+        [[maybe_unused]] int ignored = chown(pattern, kNobody, kNogroup);
+    }
+    ~ScratchDir()
+    {
+        std::error_code ignored;
+        std::filesystem::remove_all(path_, ignored);
+    }
+    const std::string &path() const { return path_; }
+    std::string operator/(const std::string &name) const { return path_ + "/" + name; }
+
+private:
+    std::string path_;
+};
+
+inline void put_file(const std::string &path, const std::string &content)
+{
+    std::ofstream(path, std::ios::binary) << content;
+}
+
+inline std::string get_file(const std::string &path)
+{
+    std::ostringstream all;
+    all << std::ifstream(path, std::ios::binary).rdbuf();
+    return all.str();
+}
+
+// Runs |body| in a forked child, as the unprivileged user when |drop|; the
+// child's gtest failures print there and fail the test here.
+inline void in_child(bool drop, const std::function<void()> &body)
+{
+    if (drop && geteuid() != 0)
+        GTEST_SKIP() << "needs root to switch users";
+    std::fflush(nullptr);
+    pid_t pid = fork();
+    if (pid == 0) {
+        if (drop && (setgroups(0, nullptr) != 0 || setgid(kNogroup) != 0 || setuid(kNobody) != 0))
+            _exit(2);
+        body();
+        std::fflush(nullptr);
+        _exit(::testing::Test::HasFailure() ? 1 : 0);
+    }
+    int status = -1;
+    waitpid(pid, &status, 0);
+    EXPECT_EQ(status, 0) << "child failed";
+}
+
+// A failure row's call.
+#define ZVT_CALL(...) [&] { return __VA_ARGS__; }
+
+// errno_out target of the failure rows, reset before each row.
+inline constexpr int32_t kUntouched = 12345;
+inline int32_t row_errno = kUntouched;
+
+// One failure: |call|, with the |nth| call at |point| failing with EIO when a
+// point is named, returns |status|; the trace holds the comma-separated
+// |frames| (oldest first, each with |status|); |row_errno| ends as |err|; the
+// log holds |log| alone (level 3, written after |log_after| frames) or
+// nothing; no descriptor or heap block is left behind.
+struct FailureRow {
+    const char *frames;
+    zv_status status;
+    std::function<zv_status()> call;
+    const char *point = nullptr;
+    unsigned nth = 1;
+    int32_t err = kUntouched;
+    std::string log = "";
+    unsigned log_after = 0;
+};
+
+inline void expect_failures(std::initializer_list<FailureRow> rows)
+{
+    for (const FailureRow &row : rows) {
+        SCOPED_TRACE(std::string(row.frames) + " / " + (row.point ? row.point : "real") +
+                     std::to_string(row.nth));
+        clear_trace();
+        row_errno = kUntouched;
+        size_t heap = heap_in_use();
+        unsigned fds = open_fd_count();
+        LogCapture log;
+        if (row.point != nullptr)
+            fault_arm(row.point, row.nth, EIO);
+        zv_status status = row.call();
+        fault_clear();
+        EXPECT_EQ(heap_in_use(), heap);
+        EXPECT_EQ(open_fd_count(), fds);
+        EXPECT_STATUS(row.status, status);
+        std::string names;
+        for (const Frame &frame : frames()) {
+            names += (names.empty() ? "" : ",") + frame.function;
+            EXPECT_STATUS(row.status, frame.status);
+        }
+        EXPECT_EQ(names, row.frames);
+        EXPECT_EQ(row_errno, row.err);
+        std::vector<LogLine> lines = log.lines();
+        EXPECT_EQ(lines.size(), row.log.empty() ? 0u : 1u);
+        if (!lines.empty()) {
+            EXPECT_EQ(lines[0].message, row.log);
+            EXPECT_EQ(lines[0].level, 3);
+            EXPECT_EQ(lines[0].mask, 128u);
+            EXPECT_EQ(lines[0].frames_before, row.log_after);
+        }
+    }
+}
+
+}  // namespace zvt
