@@ -1,4 +1,5 @@
-// Process lookup through /proc, and signal dispositions.
+// Process lookup through /proc, a bounded wait for a child, and signal
+// dispositions.
 #include <zvutil/format.h>
 #include <zvutil/process.h>
 
@@ -6,8 +7,10 @@
 #include <csignal>
 #include <cstring>
 #include <fcntl.h>
+#include <sys/wait.h>
 
 #include "process/process_internal.h"
+#include "time/time_internal.h"
 
 namespace {
 
@@ -31,7 +34,7 @@ bool set_disposition(int sig, void (*handler)(int))
 }
 
 struct ScanList {
-    struct dirent **entries = nullptr;
+    struct dirent64 **entries = nullptr;
     int count = 0;
     ~ScanList()
     {
@@ -54,7 +57,7 @@ bool read_cmdline(const char *path, char (&buffer)[kCmdlineBuffer])
 
 }  // namespace
 
-int vet_possible_directory(const struct dirent *entry)
+int vet_possible_directory(const struct dirent64 *entry)
 {
     if (entry == nullptr || entry->d_type != DT_DIR)
         return 0;
@@ -77,7 +80,7 @@ zv_status zv_util_pid_of(const char *name, int match_mode, uint32_t **pids_out,
                          uint32_t *count_out)
 {
     ScanList scan;
-    scan.count = scandir("/proc", &scan.entries, vet_possible_directory, alphasort);
+    scan.count = scandir64("/proc", &scan.entries, vet_possible_directory, alphasort64);
     if (scan.count < 0) {
         scan.count = 0;
         return ZV_LOG_FAIL(ZV_ERR_SYSTEM, "Failed to open /proc");
@@ -122,6 +125,28 @@ zv_status zv_util_pid_of(const char *name, int match_mode, uint32_t **pids_out,
         *pids_out = pids.release();
     *count_out = matches;
     return ZV_OK;
+}
+
+zv_status zv_util_await_child_timeout(pid_t pid, int32_t timeout_seconds)
+{
+    // A deadline that cannot be set stays at the epoch, and a clock that
+    // cannot be read counts as past the deadline: the wait stays bounded.
+    struct timespec deadline = {};
+    (void)zv_util_future_timeout(&deadline, timeout_seconds, 1);
+    for (;;) {
+        pid_t ended = waitpid(pid, nullptr, WNOHANG);
+        if (ended == -1)
+            return ZV_LOG_FAIL(ZV_ERR_SYSTEM, "Failed to wait for child\n");
+        if (ended != 0)
+            return ZV_OK;
+        uint32_t expired = 1;
+        (void)zv_util_query_timeout_expired(&deadline, &expired);
+        if (expired != 0) {
+            kill(pid, SIGKILL);
+            return ZV_FAIL(ZV_ERR_TIMEOUT);
+        }
+        sleep(1);
+    }
 }
 
 extern "C" {

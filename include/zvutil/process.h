@@ -53,6 +53,27 @@ ZV_EXPORT void zv_free_proc_handle(zv_proc_handle **handle);
  * sleep short. No frame. */
 ZV_EXPORT unsigned int zv_util_sleep(unsigned int seconds);
 
+/* zv_util_claim_pid_file claims the PID file |path| for the calling process,
+ * whose program name (at most 100 characters) is |name|.
+ *   ZV_OK            the file now holds the caller's process ID in decimal,
+ *                    with no newline; a new file gets mode 0664 less umask.
+ *   ZV_ERR_IN_USE    a live process whose command line begins with |name|
+ *                    holds the file; its ID is stored in |*owner_pid| (the
+ *                    only status on which it is written). File unchanged.
+ *   ZV_ERR_NULL_ARG  an argument is NULL.
+ *   ZV_ERR_ACCESS    creating the file failed with EACCES.
+ *   ZV_ERR_SYSTEM    the file cannot be created or opened, another claimer
+ *                    holds its lock, or it cannot be written.
+ *   ZV_ERR_BAD_VALUE |name| is longer than 100 characters (checked only when
+ *                    an existing, non-empty file has to be compared).
+ *   other            the status of the file read or of the /proc lookup.
+ * An empty file, or one whose content is not 1 to 10 decimal digits or names
+ * a process that is gone or runs another program, is taken over. Claimers are
+ * serialised by an exclusive flock held only during the call. The file is
+ * never deleted here. */
+ZV_EXPORT zv_status zv_util_claim_pid_file(const char *path, const char *name,
+                                           uint32_t *owner_pid);
+
 /* zv_util_ignore_signal sets |sig| to be ignored. SIGKILL, SIGTERM, SIGSTOP
  * and numbers outside 1..31 are left alone (ZV_OK). ZV_ERR_SYSTEM, without a
  * frame, when sigaction fails. */
