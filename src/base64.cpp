@@ -11,6 +11,7 @@
 #include "base64_internal.h"
 #include "cpu.h"
 #include "internal.h"
+#include "output_block.h"
 
 namespace {
 
@@ -147,7 +148,7 @@ ZV_EXPORT zv_status zv_util_base64_encode(const void *input, uint32_t length, ch
     if (length > kMaxEncodable)
         return ZV_ERR_NO_MEMORY;
     uint32_t size = zv_util_to_base64_size(length);
-    auto *text = static_cast<char *>(std::malloc(size));
+    auto *text = static_cast<char *>(zv::malloc_output(size));
     if (text == nullptr) {
         *out = nullptr;
         return ZV_ERR_NO_MEMORY;
@@ -175,7 +176,7 @@ ZV_EXPORT zv_status zv_util_base64_decode(const char *input, uint32_t length, ui
 {
     // Room for a final partial group too, so unpadded text fits.
     uint32_t size = (length / 4 + (length % 4 != 0 ? 1u : 0u)) * 3u;
-    auto *bytes = static_cast<uint8_t *>(std::malloc(size));
+    auto *bytes = static_cast<uint8_t *>(zv::malloc_output(size));
     if (bytes == nullptr) {
         *out = nullptr;
         return ZV_ERR_NO_MEMORY;
