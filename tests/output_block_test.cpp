@@ -15,7 +15,7 @@ TEST(OutputBlock, LargeBlocksAreOrdinaryAndKeepErrno)
         errno = 1234;
         auto *block = static_cast<char *>(zv::malloc_output(size));
         ASSERT_NE(block, nullptr);
-        EXPECT_EQ(errno, 1234);
+        EXPECT_EQ(errno, 1234) << "the advice's failure, if any, is not seen";
         std::memset(block, 0x5a, size);
         EXPECT_EQ(block[size - 1], 0x5a);
         std::free(block);
