@@ -125,7 +125,7 @@ uint8_t *decode_quads(const unsigned char *text, uint32_t length, uint32_t *i, u
         if ((group & kOutside) != 0)
             break;
         if (end - at >= 4)
-            std::memcpy(at, &group, 4);  // byte 3 is 0 and overwritten next
+            std::memcpy(at, &group, 4);  // byte 3 (0) lies past the group
         else
             std::memcpy(at, &group, 3);
     }
