@@ -5,7 +5,8 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
-#include <cstring>
+
+#include "internal.h"
 
 namespace zv {
 
@@ -17,11 +18,9 @@ inline constexpr auto kHexPairs = [] {
     return pairs;
 }();
 
-// Writes the 2 * n digits of |n| bytes at |out| (no terminator).
-inline void put_hex_pairs(char *out, const uint8_t *bytes, size_t n)
-{
-    for (size_t i = 0; i < n; i++)
-        std::memcpy(out + 2 * i, kHexPairs[bytes[i]].data(), 2);
-}
+// Writes the 2 * n digits of |n| bytes at |out| (no terminator): through
+// shuffles of the digit table where the processor has SSSE3, through
+// kHexPairs otherwise.
+ZV_INTERNAL void put_hex_pairs(char *out, const uint8_t *bytes, size_t n);
 
 }  // namespace zv

@@ -7,6 +7,7 @@
 
 #include "hex_pairs.h"
 #include "internal.h"
+#include "output_block.h"
 
 namespace {
 
@@ -187,7 +188,7 @@ ZV_EXPORT zv_status zv_util_append_string(char **buffer, uint32_t *length, const
 ZV_EXPORT zv_status zv_util_sprintf_bytes(const void *bytes, uint32_t n, char **out)
 {
     // From 2^31 bytes on, 2 * n + 1 does not fit 32 bits.
-    auto *text = n < 0x80000000u ? static_cast<char *>(std::malloc(2 * n + 1)) : nullptr;
+    auto *text = n < 0x80000000u ? static_cast<char *>(zv::malloc_output(2 * n + 1)) : nullptr;
     *out = text;
     if (text == nullptr)
         return ZV_LOG_FAIL(ZV_ERR_NO_MEMORY, "Allocation failed\n");

@@ -1,13 +1,16 @@
 // Descriptor operations, durable sync, path components and named files.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdlib>
 #include <fcntl.h>
+#include <random>
 #include <string>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "support/feature_paths.h"
 #include "support/scratch.h"
 #include <zvutil/file.h>
 
@@ -97,6 +100,30 @@ TEST(CountLines, CountsNewlinesAndRestoresThePosition)
         close(fd);
     }
     EXPECT_NO_FRAMES();
+}
+
+TEST(CountLines, EveryPathCountsEveryNewline)
+{
+    ScratchDir dir;
+    std::mt19937 random(3);
+    // Sizes around the 16-byte blocks and the 1024-byte reads; newlines from
+    // none to every byte.
+    for (size_t size : {1, 15, 16, 17, 1023, 1024, 1025, 2047, 5000}) {
+        for (unsigned percent : {0, 3, 50, 100}) {
+            std::string content(size, 'x');
+            for (char &c : content)
+                if (random() % 100 < percent)
+                    c = '\n';
+            put_file(dir / "f", content);
+            int fd = open_read(dir / "f");
+            zvt::for_each_feature_path([&](uint32_t path) {
+                uint32_t count = 0;
+                EXPECT_EQ(zv_util_count_lines(fd, &count, nullptr), ZV_OK);
+                EXPECT_EQ(count, std::count(content.begin(), content.end(), '\n')) << path << " " << size;
+            });
+            close(fd);
+        }
+    }
 }
 
 TEST(QueryFileExists, Answers)

@@ -4,9 +4,12 @@
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
+#include <memory>
 #include <string>
 
 #include "support/fault.h"
+#include "support/feature_paths.h"
 #include "support/trace.h"
 #include <zvutil/hex.h>
 #include <zvutil/memory.h>
@@ -49,6 +52,26 @@ TEST(HexText, EveryByteBothWays)
         std::free(back);
     }
     EXPECT_NO_FRAMES();
+}
+
+TEST(HexText, EveryPathWritesThePlainDigits)
+{
+    std::string bytes;
+    for (int i = 0; i < 4200; i++)
+        bytes += static_cast<char>(i * 167 + i / 256);
+    zvt::for_each_feature_path([&](uint32_t path) {
+        for (size_t n = 0; n < bytes.size(); n += n < 100 ? 1 : 331) {
+            for (size_t offset : {0, 1, 7}) {
+                // The bytes end where their allocation ends.
+                std::unique_ptr<char[]> block(new char[offset + n]);
+                std::memcpy(block.get() + offset, bytes.data() + n % 5, n);
+                char *out = nullptr;
+                ASSERT_EQ(zv_util_sprintf_bytes(block.get() + offset, n, &out), ZV_OK);
+                EXPECT_EQ(out, hex_of(bytes.substr(n % 5, n))) << path << " " << n;
+                std::free(out);
+            }
+        }
+    });
 }
 
 TEST(HexText, PairsThatAreNotTwoDigitsAreRefused)
