@@ -39,7 +39,10 @@ def main():
     order = defaultdict(list)
     for path in args.files:
         with open(path) as f:
-            data = json.load(f)
+            try:
+                data = json.load(f)
+            except json.JSONDecodeError:
+                continue  # a program whose benchmarks the filter left out
         for bench in data.get("benchmarks", []):
             if bench.get("run_type") == "aggregate" or "bytes_per_second" not in bench:
                 continue
