@@ -72,31 +72,21 @@ struct LaneVector<4> {
 template <int N>
 using Lanes = typename LaneVector<N>::type;
 
-// The lanes work on a pool whose next step writes word 0, so that a round
-// of the pool has the same indices wherever the run began: the record's
-// pool when it is there, else a copy rotated into place (and aligned).
-template <int N>
-[[gnu::always_inline]] inline void load_lanes(const uint64_t *pool, uint32_t i, Lanes<N> &lanes)
-{
-    std::memcpy(&lanes, pool + i, sizeof lanes);
-}
-
-// Steps i to i + N - 1 (i a multiple of N), their words stored at |out|.
-// |weyl| holds the counters of the previous group's lanes.
+// Steps i to i + N - 1 (i a multiple of N) on a pool whose run began at
+// word 0, their words stored at |out|. |weyl| holds the counters of the
+// previous group's lanes.
 template <int N>
 [[gnu::always_inline]] inline void group(uint64_t *pool, uint32_t i, Lanes<N> &weyl,
                                          unsigned char *out)
 {
-    // The words at the short lag straddle two vectors: load both whole, as
-    // they were stored, and pick the lanes out.
-    Lanes<N> t, low, high, v;
-    load_lanes<N>(pool, i, t);
-    load_lanes<N>(pool, (i + kShortLag + 1 - N) & kPoolMask, low);
-    load_lanes<N>(pool, (i + kShortLag + 1) & kPoolMask, high);
-    if constexpr (N == 4)
-        v = __builtin_shufflevector(low, high, 3, 4, 5, 6);
-    else
-        v = __builtin_shufflevector(low, high, 1, 2);
+    Lanes<N> t, v;
+    std::memcpy(&t, pool + i, sizeof t);
+    const uint32_t j = (i + kShortLag) & kPoolMask;
+    if (j + N <= 64)
+        std::memcpy(&v, pool + j, sizeof v);
+    else  // the short lag of the group at word 52 wraps
+        for (int k = 0; k < N; ++k)
+            v[k] = pool[(j + k) & kPoolMask];
     t ^= t << 33;
     t ^= t >> 26;
     v ^= v << 27;
@@ -186,6 +176,9 @@ template <int N>
     dest = steps(position, weyl, pool, dest, head);
     count -= head;
 
+    // The groups need a pool whose run begins at word 0, so that a round has
+    // the same indices wherever the run began: the record's own pool when
+    // it does, else a copy rotated into place (and aligned).
     alignas(64) uint64_t rotated[64];
     const uint32_t first = (position + 1) & kPoolMask;
     uint64_t *const lane_pool = first == 0 ? pool : rotated;
