@@ -102,7 +102,7 @@ template <int N>
 // unrolled so that every index is a constant.
 template <int N>
 [[gnu::always_inline]] inline void run_round(uint64_t *pool, Lanes<N> &weyl, unsigned char *out,
-                                         uint32_t groups)
+                                             uint32_t groups)
 {
 #pragma GCC unroll 32
     for (uint32_t g = 0; g < 64 / N; ++g) {
