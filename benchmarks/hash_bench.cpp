@@ -50,12 +50,16 @@ void BM_Ours(benchmark::State &state)
 
 void BM_XXH64(benchmark::State &state)
 {
-    run(state, [](const unsigned char *bytes, uint32_t length) { return XXH64(bytes, length, 0); });
+    run(state, [](const unsigned char *bytes, uint32_t length) {
+        return XXH64(bytes, length, 0);
+    });
 }
 
 void BM_XXH3(benchmark::State &state)
 {
-    run(state, [](const unsigned char *bytes, uint32_t length) { return XXH3_64bits(bytes, length); });
+    run(state, [](const unsigned char *bytes, uint32_t length) {
+        return XXH3_64bits(bytes, length);
+    });
 }
 
 void sizes(benchmark::internal::Benchmark *bench)

@@ -111,11 +111,14 @@ void BM_Xoshiro(benchmark::State &state)
 void BM_Memset(benchmark::State &state)
 {
     int value = 0;
-    run(state, [&](unsigned char *buffer, uint32_t length) { std::memset(buffer, ++value, length); });
+    run(state, [&](unsigned char *buffer, uint32_t length) {
+        std::memset(buffer, ++value, length);
+    });
 }
 
 // memset through 16-byte non-temporal stores (length a multiple of 16).
-__attribute__((target("sse2"))) void memset_stream(unsigned char *buffer, int value, uint32_t length)
+__attribute__((target("sse2"))) void memset_stream(unsigned char *buffer, int value,
+                                                   uint32_t length)
 {
     const __m128i fill = _mm_set1_epi8(static_cast<char>(value));
     unsigned char *at = buffer;
@@ -130,7 +133,9 @@ __attribute__((target("sse2"))) void memset_stream(unsigned char *buffer, int va
 void BM_MemsetStream(benchmark::State &state)
 {
     int value = 0;
-    run(state, [&](unsigned char *buffer, uint32_t length) { memset_stream(buffer, ++value, length); });
+    run(state, [&](unsigned char *buffer, uint32_t length) {
+        memset_stream(buffer, ++value, length);
+    });
 }
 
 #define PEERS(kernel)                                                                 \
