@@ -7,7 +7,7 @@ namespace zv {
 
 // Four xorshifts (left 10, right 15, left 4, right 13): a bijection on 64-bit
 // words that maps 0 to 0 and every other word to a non-zero one.
-[[gnu::always_inline]] inline uint64_t shift_mix(uint64_t x)
+[[gnu::always_inline]] constexpr uint64_t shift_mix(uint64_t x)
 {
     x ^= x << 10;
     x ^= x >> 15;

@@ -5,6 +5,7 @@
 
 #include <cstring>
 
+#include "cpu.h"
 #include "internal.h"
 #include "mix_internal.h"
 
@@ -38,6 +39,199 @@ constexpr int kSeedRounds = 256;    // four times the pool
     weyl += kWeylIncrement;
     position = i;
     return word + (weyl ^ (weyl >> 27));
+}
+
+// |count| single steps, each word stored at |dest| in host order; returns
+// the end of what was written.
+[[gnu::always_inline]] inline unsigned char *steps(uint32_t &position, uint64_t &weyl,
+                                                   uint64_t *pool, unsigned char *dest,
+                                                   uint32_t count)
+{
+    for (; count != 0; --count, dest += 8) {
+        uint64_t word = step(position, weyl, pool, 0);
+        std::memcpy(dest, &word, sizeof word);
+    }
+    return dest;
+}
+
+// Step n reads only the words of steps n - 64 and n - 53, so no step of a
+// run of up to 53 consecutive steps reads a word that the run writes: a
+// group of N consecutive steps can run in the N lanes of one vector, each
+// lane with its own Weyl counter. Groups run in order, so every read sees
+// the same pool word as the single steps would.
+template <int N>
+struct LaneVector;
+template <>
+struct LaneVector<2> {
+    typedef uint64_t type __attribute__((vector_size(16)));
+};
+template <>
+struct LaneVector<4> {
+    typedef uint64_t type __attribute__((vector_size(32)));
+};
+template <int N>
+using Lanes = typename LaneVector<N>::type;
+
+// Steps i to i + N - 1 (i a multiple of N) on a pool whose run began at
+// word 0, their words stored at |out|. |weyl| holds the counters of the
+// previous group's lanes.
+template <int N>
+[[gnu::always_inline]] inline void group(uint64_t *pool, uint32_t i, Lanes<N> &weyl,
+                                         unsigned char *out)
+{
+    Lanes<N> t, v;
+    std::memcpy(&t, pool + i, sizeof t);
+    const uint32_t j = (i + kShortLag) & kPoolMask;
+    if (j + N <= 64)
+        std::memcpy(&v, pool + j, sizeof v);
+    else  // the short lag of the group at word 52 wraps
+        for (int k = 0; k < N; ++k)
+            v[k] = pool[(j + k) & kPoolMask];
+    t ^= t << 33;
+    t ^= t >> 26;
+    v ^= v << 27;
+    v ^= v >> 29;
+    const Lanes<N> word = t ^ v;
+    std::memcpy(pool + i, &word, sizeof word);
+    weyl += kWeylIncrement * N;
+    const Lanes<N> output = word + (weyl ^ (weyl >> 27));
+    std::memcpy(out, &output, sizeof output);
+}
+
+// The first |groups| (at most 64 / N) groups of a round of the pool,
+// unrolled so that every index is a constant.
+template <int N>
+[[gnu::always_inline]] inline void run_round(uint64_t *pool, Lanes<N> &weyl, unsigned char *out,
+                                             uint32_t groups)
+{
+#pragma GCC unroll 32
+    for (uint32_t g = 0; g < 64 / N; ++g) {
+        if (g == groups)
+            return;
+        group<N>(pool, N * g, weyl, out + 8 * N * g);
+    }
+}
+
+// Copies |bytes| (a multiple of the vector) from |source| to |dest| with
+// non-temporal stores, which need |dest| aligned to the vector. Inline
+// assembly, since the intrinsics would not inline into this target-neutral
+// template.
+template <int N>
+[[gnu::always_inline]] inline void stream_out(unsigned char *dest, const unsigned char *source,
+                                              uint32_t bytes)
+{
+    for (uint32_t at = 0; at < bytes; at += 8 * N) {
+        Lanes<N> lanes;
+        std::memcpy(&lanes, source + at, sizeof lanes);
+        auto *line = reinterpret_cast<Lanes<N> *>(dest + at);
+        if constexpr (N == 4)
+            __asm__("vmovntdq %1, %0" : "=m"(*line) : "x"(lanes));
+        else
+            __asm__("movntdq %1, %0" : "=m"(*line) : "x"(lanes));
+    }
+}
+
+// Runs |groups| groups a round at a time. Streamed rounds go through a
+// buffer in the cache, from which whole lines leave in one burst.
+template <int N>
+[[gnu::always_inline]] inline void run_groups(uint64_t *pool, Lanes<N> &weyl, unsigned char *dest,
+                                              uint32_t groups, bool stream)
+{
+    alignas(64) unsigned char bounce[8 * 64];
+    while (groups != 0) {
+        const uint32_t now = groups < 64 / N ? groups : 64 / N;
+        run_round<N>(pool, weyl, stream ? bounce : dest, now);
+        if (stream)
+            stream_out<N>(dest, bounce, 8 * N * now);
+        dest += 8 * N * now;
+        groups -= now;
+    }
+}
+
+// Copies |count| (at most 64) pool words a vector at a time.
+template <int N>
+[[gnu::always_inline]] inline void copy_words(uint64_t *dest, const uint64_t *source,
+                                              uint32_t count)
+{
+    for (; count >= N; count -= N, dest += N, source += N)
+        std::memcpy(dest, source, 8 * N);
+    for (; count != 0; --count)
+        *dest++ = *source++;
+}
+
+// Runs of at least this many words stream their output past the caches:
+// non-temporal stores halve the speed of fills that the caches hold.
+constexpr uint32_t kStreamWords = (8u << 20) / 8;
+
+// |count| steps in N lanes, with single steps before them (to align the
+// output for streaming) and after them (the last count % N).
+template <int N>
+[[gnu::always_inline]] inline void generate_lanes(uint32_t &position, uint64_t &weyl,
+                                                  uint64_t *pool, unsigned char *dest,
+                                                  uint32_t count)
+{
+    const auto address = reinterpret_cast<uintptr_t>(dest);
+    const bool stream = count >= kStreamWords && address % 8 == 0;
+    const uint32_t head = stream ? (-address & (8 * N - 1)) / 8 : 0;
+    dest = steps(position, weyl, pool, dest, head);
+    count -= head;
+
+    // The groups need a pool whose run begins at word 0, so that a round has
+    // the same indices wherever the run began: the record's own pool when
+    // it does, else a copy rotated into place (and aligned).
+    alignas(64) uint64_t rotated[64];
+    const uint32_t first = (position + 1) & kPoolMask;
+    uint64_t *const lane_pool = first == 0 ? pool : rotated;
+    if (first != 0) {
+        copy_words<N>(rotated, pool + first, 64 - first);
+        copy_words<N>(rotated + (64 - first), pool, first);
+    }
+    Lanes<N> lanes;
+    for (int k = 0; k < N; ++k)
+        lanes[k] = weyl + kWeylIncrement * static_cast<uint64_t>(k + 1 - N);
+    const uint32_t groups = count / N;
+    run_groups<N>(lane_pool, lanes, dest, groups, stream);
+    if (stream)
+        __asm__ volatile("sfence" ::: "memory");
+    if (first != 0) {
+        copy_words<N>(pool + first, rotated, 64 - first);
+        copy_words<N>(pool, rotated + (64 - first), first);
+    }
+
+    weyl += kWeylIncrement * N * static_cast<uint64_t>(groups);
+    position = (position + N * groups) & kPoolMask;
+    steps(position, weyl, pool, dest + size_t{8} * N * groups, count % N);
+}
+
+__attribute__((target("avx2"))) void generate_avx2(uint32_t &position, uint64_t &weyl,
+                                                   uint64_t *pool, unsigned char *dest,
+                                                   uint32_t count)
+{
+    generate_lanes<4>(position, weyl, pool, dest, count);
+}
+
+__attribute__((target("sse2"))) void generate_sse2(uint32_t &position, uint64_t &weyl,
+                                                   uint64_t *pool, unsigned char *dest,
+                                                   uint32_t count)
+{
+    generate_lanes<2>(position, weyl, pool, dest, count);
+}
+
+// Shorter runs take single steps: the lanes first copy the pool.
+constexpr uint32_t kLaneMinWords = 32;
+
+// |count| steps from the given position and counter, the words stored at
+// |dest| in host order.
+void generate(uint32_t &position, uint64_t &weyl, uint64_t *pool, unsigned char *dest,
+              uint32_t count)
+{
+    if (count >= kLaneMinWords) {
+        if (zv::cpu::has(zv::cpu::kAVX2))
+            return generate_avx2(position, weyl, pool, dest, count);
+        if (zv::cpu::has(zv::cpu::kSSE2))
+            return generate_sse2(position, weyl, pool, dest, count);
+    }
+    steps(position, weyl, pool, dest, count);
 }
 
 }  // namespace
@@ -96,12 +290,7 @@ ZV_EXPORT zv_status zv_util_prng_batch(zv_util_prng_state *state, void *out, uin
 
     uint32_t position = state->position;
     uint64_t weyl = state->weyl;
-    uint64_t *const pool = state->pool;
-    auto *dest = static_cast<unsigned char *>(out);
-    for (uint32_t n = 0; n < count; ++n, dest += 8) {
-        uint64_t word = step(position, weyl, pool, 0);
-        std::memcpy(dest, &word, sizeof word);
-    }
+    generate(position, weyl, state->pool, static_cast<unsigned char *>(out), count);
     state->position = position;
     state->weyl = weyl;
     return ZV_OK;

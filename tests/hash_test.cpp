@@ -2,8 +2,11 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <random>
 #include <string>
+#include <vector>
 
+#include "cpu.h"
 #include "support/trace.h"
 #include <zvutil/hash.h>
 
@@ -40,6 +43,70 @@ TEST(Hash64, KnownValuesAtAnyAlignment)
     EXPECT_EQ(hash, 42u);
     EXPECT_FRAMES({"zv_util_hash64", ZV_ERR_BAD_VALUE}, {"zv_util_hash64", ZV_ERR_BAD_VALUE},
                   {"zv_util_hash64", ZV_ERR_BAD_VALUE});
+}
+
+// The hash as plainly as it can be put: little-endian blocks through the
+// chain, the big-endian tail, 16 closing mixes.
+uint64_t plain_hash(const unsigned char *bytes, size_t length)
+{
+    auto mix = [](uint64_t x) {
+        x ^= x << 10;
+        x ^= x >> 15;
+        x ^= x << 4;
+        return x ^ (x >> 13);
+    };
+    uint64_t state = 1;
+    size_t at = 0;
+    for (; at + 8 <= length; at += 8) {
+        uint64_t block = 0;
+        for (size_t k = 8; k-- > 0;)
+            block = block << 8 | bytes[at + k];
+        state = mix(state + block);
+    }
+    if (at < length) {
+        uint64_t tail = 0;
+        for (; at < length; ++at)
+            tail = tail << 8 | bytes[at];
+        state = mix(state + tail);
+    }
+    for (int round = 0; round < 16; ++round)
+        state = mix(state);
+    return state;
+}
+
+// Every processor path (all features, SSE2 only, none) at lengths around the
+// block, vector and prefetch thresholds and at every alignment, on random
+// bytes and on all-ones bytes (whose last word carries out of the addition).
+TEST(Hash64, EveryPathMatchesThePlainChain)
+{
+    std::vector<size_t> lengths;
+    for (size_t length = 1; length <= 80; ++length)
+        lengths.push_back(length);
+    for (size_t length : {127, 128, 129, 2047, 2048, 2111, 2112, 2113, 2120, 4096, 70001})
+        lengths.push_back(length);
+    std::vector<unsigned char> random(70001 + 8), ones(88, 0xFF);
+    std::mt19937 generator(5);
+    for (unsigned char &byte : random)
+        byte = static_cast<unsigned char>(generator());
+
+    struct Restore {
+        ~Restore() { zv::cpu::restrict(~0u); }
+    } restore;
+    for (uint32_t features : {~0u, uint32_t{zv::cpu::kSSE2}, 0u}) {
+        zv::cpu::restrict(features);
+        for (size_t length : lengths)
+            for (size_t offset = 0; offset < 8; ++offset) {
+                for (const auto *data : {&random, &ones}) {
+                    if (offset + length > data->size())
+                        continue;
+                    const unsigned char *bytes = data->data() + offset;
+                    uint64_t hash = 0;
+                    ASSERT_EQ(zv_util_hash64(bytes, static_cast<uint32_t>(length), &hash), ZV_OK);
+                    ASSERT_EQ(hash, plain_hash(bytes, length))
+                        << "length " << length << " offset " << offset << " features " << features;
+                }
+            }
+    }
 }
 
 TEST(RoundPower2, UpAndDown)

@@ -4,6 +4,7 @@
 #include <cstring>
 #include <vector>
 
+#include "cpu.h"
 #include "support/trace.h"
 #include <zvutil/random.h>
 
@@ -84,6 +85,55 @@ TEST(Prng, BatchAndFillMatchSingleSteps)
         EXPECT_TRUE(same(filled, stepped) && same(batched, stepped)) << length;
     }
     EXPECT_NO_FRAMES();
+}
+
+// The vector paths (all features, SSE2 only) against single steps: counts
+// around the lane and round thresholds, from every kind of pool position
+// (a rotated pool copy, wraps at the short lag), into unaligned output.
+TEST(Prng, LanesMatchSingleSteps)
+{
+    struct Restore {
+        ~Restore() { zv::cpu::restrict(~0u); }
+    } restore;
+    std::vector<unsigned char> out(8 * 1000 + 8);
+    for (uint32_t features : {~0u, uint32_t{zv::cpu::kSSE2}}) {
+        zv::cpu::restrict(features);
+        for (uint32_t start : {0u, 1u, 2u, 3u, 11u, 52u, 53u, 63u})
+            for (uint32_t count : {31u, 32u, 33u, 63u, 64u, 65u, 66u, 127u, 128u, 130u, 1000u}) {
+                auto batched = seeded(count, features), stepped = batched;
+                words(batched, start);
+                words(stepped, start);
+                const size_t offset = count % 8;
+                ASSERT_EQ(zv_util_prng_batch(&batched, out.data() + offset, count), ZV_OK);
+                const Words expected = words(stepped, count);
+                ASSERT_EQ(std::memcmp(out.data() + offset, expected.data(), 8 * count), 0)
+                    << "start " << start << " count " << count << " features " << features;
+                ASSERT_TRUE(same(batched, stepped)) << "start " << start << " count " << count;
+            }
+    }
+}
+
+// Runs past the caches leave through non-temporal stores once the output is
+// aligned, which takes single steps first; unaligned output cannot stream.
+TEST(Prng, StreamedBatchesMatchThePlainPath)
+{
+    struct Restore {
+        ~Restore() { zv::cpu::restrict(~0u); }
+    } restore;
+    const uint32_t count = (8u << 20) / 8 + 77;
+    std::vector<uint64_t> fast(count + 8), plain(count + 8);
+    for (uint32_t features : {~0u, uint32_t{zv::cpu::kSSE2}})
+        for (size_t offset : {size_t{8}, size_t{20}}) {  // head of 3 steps; no streaming
+            auto *fast_out = reinterpret_cast<unsigned char *>(fast.data()) + offset;
+            auto *plain_out = reinterpret_cast<unsigned char *>(plain.data()) + offset;
+            auto streamed = seeded(9, offset), stepped = streamed;
+            zv::cpu::restrict(features);
+            ASSERT_EQ(zv_util_prng_batch(&streamed, fast_out, count), ZV_OK);
+            zv::cpu::restrict(0);
+            ASSERT_EQ(zv_util_prng_batch(&stepped, plain_out, count), ZV_OK);
+            ASSERT_EQ(std::memcmp(fast_out, plain_out, 8 * size_t{count}), 0) << offset;
+            ASSERT_TRUE(same(streamed, stepped)) << offset;
+        }
 }
 
 TEST(Prng, FailuresLeaveStateAndOutputAlone)
