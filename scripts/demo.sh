@@ -8,8 +8,8 @@ scripts/deps.sh
 
 prefix=$PWD/build/prefix
 echo "== building libzvutil (i386)"
-cmake --preset i386 -DZV_BUILD_TESTS=OFF >/dev/null
-cmake --build --preset i386 >/dev/null
+cmake --preset i386 >/dev/null
+cmake --build --preset i386 --target zvutil zverrortrace zvlog >/dev/null
 echo "== installing into $prefix"
 rm -rf "$prefix"
 cmake --install build/i386 --prefix "$prefix" >/dev/null
