@@ -33,7 +33,7 @@ TEST(ProcStat, FieldsAfterACommandNameWithBlanksAndParentheses)
     // 52 fields as a current kernel prints them.
     zvt::put_file(dir / "stat",
                   "4242 (my (odd) ) name) S 1 4243 4244 34816 4245 4194560 1000 2000 3 4 500 "
-                  "600 7 8 20 -5 1 0 5000000000 123456789 -1 18446744073709551615 4096 8192 "
+                  "600 7 8 20 -5 1 0 5000000000 123456789 -1 18446744073709551615 94558123456512 4294967296 "
                   "3000 4000 5000 0 65536 4096 17 0 0 0 17 3 0 2 9000000000 10 11 12 13 14 15 "
                   "16 17 18 0\n");
     zv_proc_stat st = junk();
@@ -48,6 +48,9 @@ TEST(ProcStat, FieldsAfterACommandNameWithBlanksAndParentheses)
     EXPECT_EQ(st.vsize, 123456789u);
     EXPECT_EQ(st.rss, -1);
     EXPECT_EQ(st.rsslim, 4294967295u);
+    // Beyond 32 bits a field saturates on both targets rather than keep its low bits.
+    EXPECT_EQ(st.startcode, 4294967295u);
+    EXPECT_EQ(st.endcode, 4294967295u);
     EXPECT_EQ(st.exit_signal, 17);
     EXPECT_EQ(st.policy, 2u);
     EXPECT_EQ(st.delayacct_blkio_ticks, 9000000000ull);

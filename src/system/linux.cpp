@@ -1,6 +1,8 @@
 // The calling thread's ID, and a process's stat line from /proc.
 #include <zvutil/process.h>
 
+#include <algorithm>
+#include <cctype>
 #include <cstddef>
 #include <cstring>
 #include <iterator>
@@ -57,6 +59,34 @@ void store(char *slot, const char *text, const char *format)
     std::memcpy(slot, &narrowed, sizeof narrowed);
 }
 
+// The "%lu" and "%ld" fields fill 32-bit slots exactly as they do where long
+// is 32 bits, on x86_64 too: a value out of range saturates (as strtoul and
+// strtol do) instead of losing its upper bits, and "-n" read as unsigned wraps
+// modulo 2^32.
+void store_long32(char *slot, const char *text, bool is_signed)
+{
+    while (std::isspace(static_cast<unsigned char>(*text)))
+        text++;
+    bool negative = *text == '-';
+    if (*text == '-' || *text == '+')
+        text++;
+    unsigned long long magnitude;
+    if (!std::isdigit(static_cast<unsigned char>(*text)) ||
+        std::sscanf(text, "%llu", &magnitude) != 1)
+        return;
+    uint32_t bits;
+    if (is_signed) {
+        int64_t value = negative ? -static_cast<int64_t>(std::min(magnitude, 0x80000000ull))
+                                 : static_cast<int64_t>(std::min(magnitude, 0x7FFFFFFFull));
+        bits = static_cast<uint32_t>(value);
+    } else if (magnitude > UINT32_MAX) {
+        bits = UINT32_MAX;
+    } else {
+        bits = negative ? 0u - static_cast<uint32_t>(magnitude) : static_cast<uint32_t>(magnitude);
+    }
+    std::memcpy(slot, &bits, sizeof bits);
+}
+
 void convert(zv_proc_stat *record, const Field &field, const char *text)
 {
     char *slot = reinterpret_cast<char *>(record) + field.offset;
@@ -73,10 +103,10 @@ void convert(zv_proc_stat *record, const Field &field, const char *text)
         store<uint32_t, unsigned>(slot, text, "%u");
         break;
     case Conversion::u_long:
-        store<uint32_t, unsigned long>(slot, text, "%lu");
+        store_long32(slot, text, false);
         break;
     case Conversion::s_long:
-        store<int32_t, long>(slot, text, "%ld");
+        store_long32(slot, text, true);
         break;
     case Conversion::u64:
         store<uint64_t, unsigned long long>(slot, text, "%llu");
