@@ -167,7 +167,7 @@ ZV_EXPORT zv_status zv_util_append_string(char **buffer, uint32_t *length, const
         return ZV_FAIL(ZV_ERR_BAD_VALUE);
     uint32_t old_length = *buffer != nullptr ? *length : 0;
     // The new length and its terminator must fit 32 bits.
-    if (n > UINT32_MAX - 1 - old_length)
+    if (uint64_t{old_length} + n > UINT32_MAX - 1u)
         return ZV_FAIL(ZV_ERR_OVERFLOW);
 
     // Always a new block of exactly the new size; exactly n bytes of text.

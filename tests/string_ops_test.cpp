@@ -198,6 +198,7 @@ TEST(Append, RefusedCallsChangeNothing)
         {true, true, true, false, 0, 1, ZV_ERR_BAD_VALUE},
         {true, true, true, true, 0, UINT32_MAX, ZV_ERR_OVERFLOW},
         {true, true, true, false, UINT32_MAX - 2, 2, ZV_ERR_OVERFLOW},  // the NUL would not fit
+        {true, true, true, false, UINT32_MAX, 1, ZV_ERR_OVERFLOW},
     };
     for (const Row &row : rows) {
         zvt::clear_trace();
