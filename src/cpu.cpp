@@ -21,8 +21,6 @@ uint32_t detect()
         found |= kSSE2;
     if (__builtin_cpu_supports("ssse3"))
         found |= kSSSE3;
-    if (__builtin_cpu_supports("sse4.1"))
-        found |= kSSE41;
     if (__builtin_cpu_supports("avx2"))
         found |= kAVX2;
     return found;

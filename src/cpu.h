@@ -13,8 +13,7 @@ namespace zv::cpu {
 enum : uint32_t {
     kSSE2 = 1u << 0,
     kSSSE3 = 1u << 1,
-    kSSE41 = 1u << 2,
-    kAVX2 = 1u << 3,
+    kAVX2 = 1u << 2,
 };
 
 // The usable features: what the processor and the kernel support, less any

@@ -112,10 +112,7 @@ private:
                           __LINE__, __VA_ARGS__),                                         \
      (status))
 
-// Plain log lines, for paths that go on or that record no frame.
+// A plain log line, for paths that go on or that record no frame.
 #define ZV_LOG(level, ...)                                                                \
     zv_util_log_internal((level), ::zv::kLogMask, __func__, ZV_SOURCE_FILE, __LINE__,     \
                          __VA_ARGS__)
-#define ZV_LOG_PERROR(errnum, format)                                                     \
-    zv_util_log_internal_perror((errnum), ::zv::kLogError, ::zv::kLogMask, __func__,      \
-                                ZV_SOURCE_FILE, __LINE__, (format))

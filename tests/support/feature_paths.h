@@ -9,7 +9,7 @@
 namespace zvt {
 
 inline constexpr uint32_t kFeaturePaths[] = {
-    ~0u, zv::cpu::kSSE2 | zv::cpu::kSSSE3 | zv::cpu::kSSE41, zv::cpu::kSSE2, 0};
+    ~0u, zv::cpu::kSSE2 | zv::cpu::kSSSE3, zv::cpu::kSSE2, 0};
 
 template <typename Check>
 void for_each_feature_path(Check check)
