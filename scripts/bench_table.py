@@ -49,7 +49,7 @@ def main():
     # kernel -> size -> implementation -> bytes per second, or (seconds,)
     table = defaultdict(lambda: defaultdict(dict))
     medians = set()
-    order = defaultdict(list)
+    order = defaultdict(dict)  # kernel -> implementation -> registration order
     for path in args.files:
         with open(path) as f:
             try:
@@ -73,12 +73,13 @@ def main():
             else:
                 unit = TIME_UNITS[bench.get("time_unit", "ns")]
                 table[kernel][size][impl] = (bench["real_time"] * unit,)
-            if impl not in order[kernel]:
-                order[kernel].append(impl)
+            rank = bench.get("family_index", len(order[kernel]))
+            order[kernel][impl] = min(rank, order[kernel].get(impl, rank))
 
     print(f"== {args.title}" + (f" ({args.note})" if args.note else ""))
     for kernel in table:
-        impls = [OURS] + [i for i in order[kernel] if i != OURS]
+        peers = sorted(order[kernel], key=order[kernel].get)
+        impls = [OURS] + [i for i in peers if i != OURS]
         timed = any(isinstance(v, tuple) for c in table[kernel].values() for v in c.values())
         ratio = "time ours/" if timed else "ours/"
         header = ["size"] + [i if i == OURS else f"{i} ({ratio}{i})" for i in impls]
