@@ -15,9 +15,10 @@ namespace {
 // storage until execve replaces it (CLONE_VM | CLONE_VFORK, the caller's thread
 // waiting meanwhile), so starting it costs the same whatever the caller's size,
 // where fork would copy its page tables. Until execve the child runs on a small
-// stack of its own, calls the kernel directly (no C library or sanitizer
-// wrapper runs on the shared memory), allocates nothing and writes only its
-// stack and errno, whose slot is the caller's and which zv_spawn puts back.
+// stack of its own, allocates nothing, makes only system calls (the signal
+// ones straight to the kernel, past any wrapper or sanitizer interceptor) and
+// writes only its stack and errno, whose slot is the caller's and which
+// zv_spawn puts back.
 
 // The kernel's signal set (64 signals) and its rt_sigaction record, the same
 // layout on i386 and x86_64.
@@ -29,6 +30,10 @@ struct KernelSigaction {
     void (*restorer)();
     unsigned long mask[kSigsetBytes / sizeof(unsigned long)];
 };
+
+// Holds start_child's frame and the system call wrappers; no signal handler
+// ever runs on it.
+constexpr size_t kChildStackBytes = 4096;
 
 struct ChildStart {
     char *const *argv;
@@ -74,7 +79,7 @@ ZV_EXPORT zv_status zv_spawn(char *const argv[], char *const envp[],
     syscall(SYS_rt_sigprocmask, static_cast<long>(SIG_SETMASK), &all, &caller_mask,
             kSigsetBytes);
     ChildStart start{argv, envp, &caller_mask};
-    alignas(16) char child_stack[4096];
+    alignas(16) char child_stack[kChildStackBytes];
     int caller_errno = errno;
     pid_t pid = clone(start_child, child_stack + sizeof child_stack,
                       CLONE_VM | CLONE_VFORK | SIGCHLD, &start);
