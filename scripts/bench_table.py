@@ -3,7 +3,9 @@
 
 Benchmarks are named KERNEL/IMPLEMENTATION/SIZE (extra /parts are ignored);
 the implementation "zvutil" is this library, every other one is a peer. Each
-cell shows the throughput and, for peers, the ratio ours/peer.
+cell shows the throughput and, for peers, the ratio ours/peer; benchmarks that
+report no byte count show the wall-clock time per iteration instead, with the
+ratio of times ours/peer (lower is faster). With repetitions, the median counts.
 """
 import argparse
 import json
@@ -14,7 +16,7 @@ OURS = "zvutil"
 
 
 def human_bytes(n):
-    for unit, size in (("MiB", 1 << 20), ("KiB", 1 << 10)):
+    for unit, size in (("GiB", 1 << 30), ("MiB", 1 << 20), ("KiB", 1 << 10)):
         if n >= size and n % size == 0:
             return f"{n // size} {unit}"
     return f"{n} B"
@@ -27,6 +29,16 @@ def human_rate(bytes_per_second):
     return f"{bytes_per_second / 1e3:.1f} kB/s"
 
 
+def human_time(seconds):
+    for unit, size in (("s", 1.0), ("ms", 1e-3), ("us", 1e-6)):
+        if seconds >= size:
+            return f"{seconds / size:.3g} {unit}"
+    return f"{seconds / 1e-9:.3g} ns"
+
+
+TIME_UNITS = {"ns": 1e-9, "us": 1e-6, "ms": 1e-3, "s": 1.0}
+
+
 def main():
     parser = argparse.ArgumentParser()
     parser.add_argument("--title", default="")
@@ -34,9 +46,10 @@ def main():
     parser.add_argument("files", nargs="+")
     args = parser.parse_args()
 
-    # kernel -> size -> implementation -> bytes per second
+    # kernel -> size -> implementation -> bytes per second, or (seconds,)
     table = defaultdict(lambda: defaultdict(dict))
-    order = defaultdict(list)
+    medians = set()
+    order = defaultdict(dict)  # kernel -> implementation -> registration order
     for path in args.files:
         with open(path) as f:
             try:
@@ -44,20 +57,32 @@ def main():
             except json.JSONDecodeError:
                 continue  # a program whose benchmarks the filter left out
         for bench in data.get("benchmarks", []):
-            if bench.get("run_type") == "aggregate" or "bytes_per_second" not in bench:
+            median = bench.get("run_type") == "aggregate"
+            if median and bench.get("aggregate_name") != "median":
                 continue
-            parts = bench["name"].split("/")
+            parts = bench.get("run_name", bench["name"]).split("/")
             if len(parts) < 3 or not re.fullmatch(r"\d+", parts[2]):
                 continue
             kernel, impl, size = parts[0], parts[1], int(parts[2])
-            table[kernel][size][impl] = bench["bytes_per_second"]
-            if impl not in order[kernel]:
-                order[kernel].append(impl)
+            if (kernel, impl, size) in medians:
+                continue
+            if median:
+                medians.add((kernel, impl, size))
+            if "bytes_per_second" in bench:
+                table[kernel][size][impl] = bench["bytes_per_second"]
+            else:
+                unit = TIME_UNITS[bench.get("time_unit", "ns")]
+                table[kernel][size][impl] = (bench["real_time"] * unit,)
+            rank = bench.get("family_index", len(order[kernel]))
+            order[kernel][impl] = min(rank, order[kernel].get(impl, rank))
 
     print(f"== {args.title}" + (f" ({args.note})" if args.note else ""))
     for kernel in table:
-        impls = [OURS] + [i for i in order[kernel] if i != OURS]
-        header = ["size"] + [i if i == OURS else f"{i} (ours/{i})" for i in impls]
+        peers = sorted(order[kernel], key=order[kernel].get)
+        impls = [OURS] + [i for i in peers if i != OURS]
+        timed = any(isinstance(v, tuple) for c in table[kernel].values() for v in c.values())
+        ratio = "time ours/" if timed else "ours/"
+        header = ["size"] + [i if i == OURS else f"{i} ({ratio}{i})" for i in impls]
         rows = []
         for size in sorted(table[kernel]):
             cells = table[kernel][size]
@@ -67,6 +92,10 @@ def main():
                 rate = cells.get(impl)
                 if rate is None:
                     row.append("-")
+                elif timed:
+                    cell = human_time(rate[0])
+                    row.append(cell if impl == OURS or ours is None
+                               else f"{cell} ({ours[0] / rate[0]:.2f}x)")
                 elif impl == OURS or ours is None:
                     row.append(human_rate(rate))
                 else:

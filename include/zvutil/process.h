@@ -22,7 +22,7 @@ typedef struct zv_proc_handle {
  * vector |argv| and the whole environment |envp|, both NULL-terminated, and
  * stores a new handle in |*handle_out|. None of the pointers is tested.
  *   ZV_ERR_NO_MEMORY  the handle cannot be allocated; |*handle_out| is NULL.
- *   ZV_ERR_SYSTEM     fork failed; |*handle_out| is NULL.
+ *   ZV_ERR_SYSTEM     the child process cannot be created; |*handle_out| is NULL.
  * One frame on each failure. A program that cannot be started is not seen
  * here: its child ends with exit status 1, which zv_wait reports. */
 ZV_EXPORT zv_status zv_spawn(char *const argv[], char *const envp[],
