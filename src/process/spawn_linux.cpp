@@ -57,8 +57,13 @@ struct ChildStart {
     }
     syscall(SYS_rt_sigprocmask, static_cast<long>(SIG_SETMASK), start->caller_mask, nullptr,
             kSigsetBytes);
-    execve(start->argv[0], start->argv, start->envp);
-    _exit(1);
+    // Straight system calls here too: a first call through a lazily bound
+    // entry would run the dynamic linker's resolver, whose frame (the saved
+    // vector state) can outgrow this stack. syscall itself was bound by the
+    // caller's mask change above. Exit code 1 as _exit(1) gives it.
+    syscall(SYS_execve, start->argv[0], start->argv, start->envp);
+    syscall(SYS_exit_group, 1L);
+    return 1;
 }
 
 }  // namespace
