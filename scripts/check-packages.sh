@@ -44,7 +44,8 @@ step() { echo "== $*"; }
 
 step "apt-get install ${debs[*]##*/}"
 installed=yes
-"${apt[@]}" install "${debs[@]}" | grep -E '^(Setting up|Unpacking)' || true
+"${apt[@]}" install "${debs[@]}" > "$work/apt.log" 2>&1 || { cat "$work/apt.log"; exit 1; }
+grep -E '^Setting up' "$work/apt.log"
 dpkg -L libzvutil-dev:$arch | grep -E "/usr/lib/$triplet/(libzvutil\.so$|pkgconfig|cmake/zvutil/zvutilConfig)"
 ls /usr/lib/$triplet/libzvutil.so.1 /usr/lib/$triplet/libzverrortrace.so.1 /usr/lib/$triplet/libzvlog.so.1
 
