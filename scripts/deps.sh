@@ -1,14 +1,14 @@
 #!/usr/bin/env bash
 # Installs, on Debian 12, what building and testing the library need:
 # compilers for both targets, CMake, Ninja, make, pkg-config, GoogleTest for
-# both targets, qemu-user for kernels that cannot run i386 programs, and
-# mandoc for the manual-page check.
+# both targets, qemu-user for kernels that cannot run i386 programs,
+# mandoc for the manual-page check and abigail-tools for the ABI check.
 # Pass extra package names to install them as well. Does nothing when all
 # are present.
 set -euo pipefail
 
 packages=(ca-certificates gcc g++ g++-multilib make cmake ninja-build pkg-config binutils
-          file libgtest-dev libgtest-dev:i386 qemu-user mandoc "$@")
+          file libgtest-dev libgtest-dev:i386 qemu-user mandoc abigail-tools "$@")
 
 sudo=
 if [ "$(id -u)" -ne 0 ]; then sudo=sudo; fi
