@@ -1,14 +1,16 @@
 #!/usr/bin/env bash
 # Installs, on Debian 12, what building and testing the library need:
-# compilers for both targets, CMake, Ninja, make, pkg-config, GoogleTest for
-# both targets, qemu-user for kernels that cannot run i386 programs,
-# mandoc for the manual-page check and abigail-tools for the ABI check.
+# compilers for both targets (GCC, and clang with its sanitizer and libFuzzer
+# runtimes), CMake, Ninja, make, pkg-config, GoogleTest for both targets,
+# qemu-user for kernels that cannot run i386 programs, mandoc for the
+# manual-page check and abigail-tools for the ABI check.
 # Pass extra package names to install them as well. Does nothing when all
 # are present.
 set -euo pipefail
 
-packages=(ca-certificates gcc g++ g++-multilib make cmake ninja-build pkg-config binutils
-          file libgtest-dev libgtest-dev:i386 qemu-user mandoc abigail-tools "$@")
+packages=(ca-certificates gcc g++ g++-multilib clang libclang-rt-14-dev make cmake ninja-build
+          pkg-config binutils file libgtest-dev libgtest-dev:i386 qemu-user mandoc abigail-tools
+          "$@")
 
 sudo=
 if [ "$(id -u)" -ne 0 ]; then sudo=sudo; fi

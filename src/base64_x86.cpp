@@ -63,7 +63,7 @@ ZV_AVX2 inline __m256i encode_lanes(__m256i in)
 // '/' (high nibble 2, like '+') is corrected by -3.
 #define ZV_DECODE_MASKS \
     0xa8, 0xf8, 0xf8, 0xf8, 0xf8, 0xf8, 0xf8, 0xf8, 0xf8, 0xf8, 0xf0, 0x54, 0x50, 0x50, 0x50, 0x54
-#define ZV_DECODE_BITS 1, 2, 4, 8, 16, 32, 64, 128, 0, 0, 0, 0, 0, 0, 0, 0
+#define ZV_DECODE_BITS 1, 2, 4, 8, 16, 32, 64, 0x80, 0, 0, 0, 0, 0, 0, 0, 0
 #define ZV_DECODE_OFFSETS 0, 0, 62 - '+', 52 - '0', -'A', -'A', 26 - 'a', 26 - 'a', 0, 0, 0, 0, 0, 0, 0, 0
 // Four values per word to three bytes: v0 v1 v2 v3 -> (v0 << 6 | v1) and
 // (v2 << 6 | v3) -> the 24-bit group, whose bytes are then put in order.

@@ -47,6 +47,11 @@ struct FileCloser {
 };
 using unique_file = std::unique_ptr<FILE, FileCloser>;
 
+// What the library opens for itself and closes before returning is opened
+// close-on-exec (O_CLOEXEC, the "e" stream mode), so that a program started
+// meanwhile by another thread does not inherit it. What the caller receives
+// is opened exactly as asked.
+
 // Owns a descriptor; closing on the way out keeps errno as the failure left it.
 class unique_fd {
 public:

@@ -48,7 +48,7 @@ struct ScanList {
 // False when the process is gone or its command line cannot be read.
 bool read_cmdline(const char *path, char (&buffer)[kCmdlineBuffer])
 {
-    zv::unique_fd fd(open(path, O_RDONLY));
+    zv::unique_fd fd(open(path, O_RDONLY | O_CLOEXEC));
     if (!fd)
         return false;
     std::memset(buffer, 0, sizeof buffer);
@@ -72,7 +72,7 @@ int vet_possible_directory(const struct dirent64 *entry)
         return 0;
     }
     zv::unique_malloc<char> owned_path(path);
-    zv::unique_fd fd(open(path, O_RDONLY));
+    zv::unique_fd fd(open(path, O_RDONLY | O_CLOEXEC));
     return fd ? 1 : 0;
 }
 

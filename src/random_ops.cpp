@@ -113,9 +113,11 @@ template <int N>
 }
 
 // Copies |bytes| (a multiple of the vector) from |source| to |dest| with
-// non-temporal stores, which need |dest| aligned to the vector. Inline
-// assembly, since the intrinsics would not inline into this target-neutral
-// template.
+// non-temporal stores, which need |dest| aligned to the vector. GCC gets
+// inline assembly, since the intrinsics would not inline into this
+// target-neutral template; clang checks an operand's size against the
+// template's own target, so it gets its builtin, which emits the same
+// instruction once inlined.
 template <int N>
 [[gnu::always_inline]] inline void stream_out(unsigned char *dest, const unsigned char *source,
                                               uint32_t bytes)
@@ -124,10 +126,14 @@ template <int N>
         Lanes<N> lanes;
         std::memcpy(&lanes, source + at, sizeof lanes);
         auto *line = reinterpret_cast<Lanes<N> *>(dest + at);
+#ifdef __clang__
+        __builtin_nontemporal_store(lanes, line);
+#else
         if constexpr (N == 4)
             __asm__("vmovntdq %1, %0" : "=m"(*line) : "x"(lanes));
         else
             __asm__("movntdq %1, %0" : "=m"(*line) : "x"(lanes));
+#endif
     }
 }
 

@@ -95,9 +95,10 @@ ZV_EXPORT zv_status zv_util_split(const char *text, const char *separator, char 
     }
 
     // On a 32-bit target a huge count would wrap the array size.
-    auto **fields = count <= SIZE_MAX / sizeof(char *)
-                        ? static_cast<char **>(std::malloc(count * sizeof(char *)))
-                        : nullptr;
+    size_t bytes;
+    auto **fields = __builtin_mul_overflow(size_t{count}, sizeof(char *), &bytes)
+                        ? nullptr
+                        : static_cast<char **>(std::malloc(bytes));
     if (fields == nullptr) {
         *fields_out = nullptr;
         return ZV_LOG_FAIL(ZV_ERR_NO_MEMORY, "Memory allocation failed\n");

@@ -5,7 +5,8 @@
 
 #define ZV_TRACE_EXPORT __attribute__((visibility("default")))
 
-/* A ring of the most recent frames; older ones are overwritten. */
+/* Each thread keeps its own ring of its most recent frames, older ones
+ * overwritten, so threads never share one. */
 enum { TRACE_CAPACITY = 256 };
 
 struct trace_ring {

@@ -2,6 +2,7 @@
 #include "zvlog.h"
 
 #include <errno.h>
+#include <pthread.h>
 #include <stdarg.h>
 #include <stdio.h>
 #include <stdlib.h>
@@ -18,25 +19,20 @@ static void default_sink(void *context, int32_t level, uint32_t mask, const char
             file ? file : "?", (int)line, message);
 }
 
-/* The sink and its context change together, so they are published as one pointer. */
-struct sink_binding {
-    zv_log_sink sink;
-    void *context;
-};
-
-static struct sink_binding default_binding = {default_sink, NULL};
-static struct sink_binding custom_binding;
-static struct sink_binding *_Atomic current = &default_binding;
+/* The sink and its context change together: both are read and written under
+ * one lock, which a delivery holds while the sink runs, so a sink that is
+ * replaced finishes its message before the set returns. The lock is
+ * recursive so that a sink may itself log or set a sink. */
+static pthread_mutex_t binding_lock = PTHREAD_RECURSIVE_MUTEX_INITIALIZER_NP;
+static zv_log_sink current_sink = default_sink;
+static void *current_context;
 
 ZV_LOG_EXPORT void zv_log_set_sink(zv_log_sink sink, void *context)
 {
-    if (sink == NULL) {
-        current = &default_binding;
-        return;
-    }
-    custom_binding.sink = sink;
-    custom_binding.context = context;
-    current = &custom_binding;
+    pthread_mutex_lock(&binding_lock);
+    current_sink = sink != NULL ? sink : default_sink;
+    current_context = sink != NULL ? context : NULL;
+    pthread_mutex_unlock(&binding_lock);
 }
 
 static void deliver(int32_t level, uint32_t mask, const char *function, const char *file,
@@ -44,8 +40,13 @@ static void deliver(int32_t level, uint32_t mask, const char *function, const ch
 {
     if (length > 0 && message[length - 1] == '\n')
         message[length - 1] = '\0';
-    struct sink_binding *binding = current;
-    binding->sink(binding->context, level, mask, function, file, line, message);
+    /* A thread cancelled inside the sink would leave the lock held. */
+    int cancel_state;
+    pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &cancel_state);
+    pthread_mutex_lock(&binding_lock);
+    current_sink(current_context, level, mask, function, file, line, message);
+    pthread_mutex_unlock(&binding_lock);
+    pthread_setcancelstate(cancel_state, NULL);
 }
 
 ZV_LOG_EXPORT void zv_util_log_internal(int32_t level, uint32_t mask, const char *function,

@@ -50,7 +50,7 @@ ZV_EXPORT zv_status zv_util_read_named_file(const char *path, char **buf_out, ui
     auto size = static_cast<uint32_t>(measured);
     *size_out = size;
 
-    zv::unique_file stream(zv_util_open_stream(path, "rb"));
+    zv::unique_file stream(zv_util_open_stream(path, "rbe"));
     if (!stream)
         return ZV_FAIL(ZV_ERR_SYSTEM);
     zv::unique_malloc<char> buffer(static_cast<char *>(std::malloc(size_t{size} + 1)));
@@ -88,7 +88,7 @@ ZV_EXPORT zv_status zv_util_write_named_file(const char *path, int32_t truncate,
         return ZV_FAIL(status);
     zv::unique_malloc<char> directory(text);
 
-    zv::unique_file stream(zv_util_open_stream(path, truncate != 0 ? "wb" : "ab"));
+    zv::unique_file stream(zv_util_open_stream(path, truncate != 0 ? "wbe" : "abe"));
     if (!stream)
         return ZV_FAIL(ZV_ERR_SYSTEM);
     std::clearerr(stream.get());

@@ -6,7 +6,8 @@
 #include "internal.h"
 
 // fopen(path, mode), nothing added: the one place where the file family opens
-// streams. No frame, no log line; NULL with errno set on failure.
+// streams (its own with "e" in |mode|). No frame, no log line; NULL with errno
+// set on failure.
 ZV_INTERNAL FILE *zv_util_open_stream(const char *path, const char *mode);
 
 namespace zv {

@@ -218,7 +218,7 @@ ZV_EXPORT zv_status zv_util_get_file_size(const char *path, int64_t *size_out)
 {
     if (path == nullptr || size_out == nullptr)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
-    zv::unique_fd fd(::open(path, O_RDONLY));
+    zv::unique_fd fd(::open(path, O_RDONLY | O_CLOEXEC));
     if (!fd)
         return ZV_FAIL(ZV_ERR_SYSTEM);
     struct stat64 st;

@@ -35,7 +35,7 @@ ZV_EXPORT zv_status zv_util_sync(FILE *stream, const char *dir_path)
     if (dir_path == nullptr)
         return ZV_OK;
 
-    zv::unique_fd dir(::open(dir_path, O_RDONLY));
+    zv::unique_fd dir(::open(dir_path, O_RDONLY | O_CLOEXEC));
     if (!dir)
         return ZV_FAIL(ZV_ERR_SYSTEM);
     if (::fsync(dir.get()) != 0)
@@ -57,10 +57,10 @@ ZV_EXPORT zv_status zv_util_sync_file(const char *path)
 
     // Both descriptors are open before either sync; destruction closes the
     // directory's first.
-    zv::unique_fd file(::open(path, O_RDWR));
+    zv::unique_fd file(::open(path, O_RDWR | O_CLOEXEC));
     if (!file)
         return ZV_LOG_FAIL(ZV_ERR_SYSTEM, "Failed to open file\n");
-    zv::unique_fd dir(::open(zv::sync_directory(directory.get()), O_RDONLY));
+    zv::unique_fd dir(::open(zv::sync_directory(directory.get()), O_RDONLY | O_CLOEXEC));
     if (!dir)
         return ZV_LOG_FAIL(ZV_ERR_SYSTEM, "Failed to open directory\n");
     if (::fsync(file.get()) != 0)

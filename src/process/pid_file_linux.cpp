@@ -102,7 +102,7 @@ zv_status map_pid_to_exe(const char *pid_text, char **cmdline_out, uint32_t leng
         return ZV_FAIL(status);
     }
     zv::unique_malloc<char> path(raw_path);
-    zv::unique_fd fd(open(path.get(), O_RDONLY));
+    zv::unique_fd fd(open(path.get(), O_RDONLY | O_CLOEXEC));
     int open_errno = errno;
     path.reset();
     if (!fd && open_errno == ENOENT)
@@ -123,7 +123,7 @@ zv_status map_pid_to_exe(const char *pid_text, char **cmdline_out, uint32_t leng
 
 zv_status write_pid_file(const char *path)
 {
-    zv::unique_file stream(std::fopen(path, "w"));
+    zv::unique_file stream(std::fopen(path, "we"));
     if (!stream)
         return ZV_FAIL(ZV_ERR_SYSTEM);
     char digits[16];
@@ -146,14 +146,14 @@ ZV_EXPORT zv_status zv_util_claim_pid_file(const char *path, const char *name,
     if (path == nullptr || name == nullptr || owner_pid == nullptr)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
 
-    LockedFile file(open(path, O_RDWR | O_CREAT | O_EXCL, kPidFileMode));
+    LockedFile file(open(path, O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, kPidFileMode));
     if (!file.valid()) {
         int open_errno = errno;
         if (open_errno == EACCES)
             return ZV_FAIL(ZV_ERR_ACCESS);
         if (open_errno != EEXIST)
             return ZV_LOG_FAIL(ZV_ERR_SYSTEM, "Cannot access pid file %s (%m)", path);
-        file.reset(open(path, O_RDWR));
+        file.reset(open(path, O_RDWR | O_CLOEXEC));
         if (!file.valid()) {
             open_errno = errno;
             return ZV_LOG_FAIL(ZV_ERR_SYSTEM, "Failed to open pid file %s errno %d", path,

@@ -139,7 +139,7 @@ zv_status zv_util_proc_stat(zv_proc_stat *ret_proc_stat, const char *path)
         return ZV_LOG_FAIL(ZV_ERR_NULL_ARG, "ret_proc_stat is NULL\n");
     std::memset(ret_proc_stat, 0, sizeof *ret_proc_stat);
 
-    zv::unique_file stream(std::fopen(path, "r"));
+    zv::unique_file stream(std::fopen(path, "re"));
     if (!stream)
         return ZV_FAIL(ZV_ERR_OPEN_FAILED);
     char *raw_line = nullptr;

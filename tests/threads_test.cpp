@@ -1,0 +1,65 @@
+// Threads failing library calls while the log sink is swapped, and first
+// callers racing the processor check. Meant for ThreadSanitizer (preset tsan).
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <thread>
+
+#include <zverrortrace.h>
+#include <zvlog.h>
+#include <zvutil/zvutil.h>
+
+#include "cpu.h"
+
+// A sink that finds another sink's context, or one replaced before the set
+// returned, marks it wrong.
+struct Binding { int id; std::atomic<int> live, wrong, lines; };
+
+template <int Id>
+static void sink(void *data, int32_t, uint32_t, const char *, const char *, int32_t, const char *)
+{
+    auto *binding = static_cast<Binding *>(data);
+    binding->wrong |= binding->id != Id || !binding->live;
+    binding->lines++;
+}
+
+// Runs body(0) .. body(3) on four threads that start together.
+template <typename Body>
+static void run_threads(Body body)
+{
+    std::atomic<int> waiting{4};
+    std::jthread threads[4];
+    for (int t = 0; t < 4; ++t)
+        threads[t] = std::jthread([&, t] { for (--waiting; waiting != 0;) {} body(t); });
+}
+
+TEST(Threads, SinkSwapsWhileOthersLogAndRecordFrames)
+{
+    Binding b[2] = {{0, 0, 0, 0}, {1, 0, 0, 0}};
+    std::atomic<int> swaps{0};
+    run_threads([&](int t) {
+        // Thread 0 swaps until the others have logged 12000 lines, each
+        // iteration of theirs after one more swap.
+        for (int i = 0; t == 0 && i < 1 << 22 && b[0].lines + b[1].lines < 12000; swaps = ++i) {
+            b[(i + 1) % 2].live = 1;
+            zv_log_set_sink(i % 2 ? sink<0> : sink<1>, &b[(i + 1) % 2]);
+            b[i % 2].live = 0;
+        }
+        for (int i = 0; t != 0 && i < 2000; ++i) {  // two lines and two frames each
+            while (swaps <= i)
+                std::this_thread::yield();
+            zv_trace_clear();
+            EXPECT_TRUE(zv_util_split(nullptr, ",", nullptr, nullptr) == ZV_ERR_NULL_ARG &&
+                        zv_util_unsetenv("a=b") == ZV_ERR_SYSTEM && zv_trace_count() == 2);
+        }
+    });
+    zv_log_set_sink(nullptr, nullptr);
+    EXPECT_TRUE(!b[0].wrong && !b[1].wrong && b[0].lines + b[1].lines == 12000);
+}
+
+TEST(Threads, FirstCallersOfTheProcessorCheckAgree)
+{
+    uint32_t seen[4];
+    run_threads([&](int t) { seen[t] = zv::cpu::features(); });
+    EXPECT_TRUE(seen[0] == seen[1] && seen[1] == seen[2] && seen[2] == seen[3]);
+}
