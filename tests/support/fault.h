@@ -1,9 +1,10 @@
 // Fault injection: the test executable links the library's archive with
-// -Wl,--wrap=NAME for every function support/wrap.cpp wraps, so calls to it
+// -Wl,--wrap=NAME for every function support/fault.cpp wraps, so calls to it
 // (the test's own included) pass through a wrapper that fails with the armed
 // errno when its point fires. Points are named after the function ("alloc"
-// for every allocation); a name no wrapper serves fails the test. Arm right
-// before the call under test and clear right after it (with_fault does both).
+// for every allocation); a name no wrapper serves fails the test. Arming
+// covers every caller, so arm right before the call under test and clear
+// right after it (with_fault does both).
 #pragma once
 
 #include <functional>
@@ -35,15 +36,10 @@ auto with_fault(const char *point, unsigned nth, int err, F &&call)
     return result;
 }
 
-// Every call of the open family, recorded by its wrapper: |flags| is the
-// descriptor call's open flags (-1 for a stream), |mode| the stream's mode
-// string ("" for a descriptor).
-struct OpenCall {
-    char function[16];
-    char path[256];
-    int flags;
-    char mode[8];
-};
+// Every open and fopen call (the two the library's archive makes), recorded by
+// its wrapper without heap use: |flags| are the open flags (-1 for fopen),
+// |mode| is fopen's mode ("" for open). Each test starts with an empty log.
+struct OpenCall { char function[16]; char path[256]; int flags; char mode[8]; };
 void open_log_clear();
 std::vector<OpenCall> open_log();  // calls since the last clear, oldest first
 

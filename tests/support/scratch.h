@@ -5,10 +5,7 @@
 
 #include <filesystem>
 #include <fstream>
-#include <functional>
 #include <grp.h>
-#include <sstream>
-#include <string>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -48,9 +45,7 @@ inline void put_file(const std::string &path, const std::string &content)
 
 inline std::string get_file(const std::string &path)
 {
-    std::ostringstream all;
-    all << std::ifstream(path, std::ios::binary).rdbuf();
-    return all.str();
+    return {std::istreambuf_iterator<char>(std::ifstream(path, std::ios::binary).rdbuf()), {}};
 }
 
 // Runs |body| in a forked child, as the unprivileged user when |drop|; the
@@ -110,7 +105,7 @@ inline void expect_failures(std::initializer_list<FailureRow> rows)
         EXPECT_EQ(heap_in_use(), heap);
         EXPECT_EQ(open_fd_count(), fds);
         EXPECT_STATUS(row.status, status);
-        std::string names, lines, want = "3/128/" + std::to_string(row.log_after) + " " + row.log;
+        std::string names, lines, want;
         for (const Frame &frame : frames()) {
             names += (names.empty() ? "" : ",") + frame.function;
             EXPECT_STATUS(row.status, frame.status);
@@ -119,8 +114,10 @@ inline void expect_failures(std::initializer_list<FailureRow> rows)
         EXPECT_EQ(row_errno, row.err);
         for (const LogLine &l : log.lines())
             lines += std::to_string(l.level) + "/" + std::to_string(l.mask) + "/" +
-                     std::to_string(l.frames_before) + " " + l.message;
-        EXPECT_EQ(lines, row.log.empty() ? "" : want) << "log as level/mask/frames before";
+                     std::to_string(l.frames_before) + " " + l.message + "\n";
+        if (!row.log.empty())
+            want = "3/128/" + std::to_string(row.log_after) + " " + row.log + "\n";
+        EXPECT_EQ(lines, want) << "log lines as level/mask/frames before";
     }
 }
 
