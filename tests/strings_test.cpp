@@ -242,8 +242,9 @@ TEST(Strings, FailureTable)
         {join, kNull, ZVT_CALL(zv_util_join(strings, 1, ",", nullptr, &size))},
         {join, kNull, ZVT_CALL(zv_util_join(strings, 1, ",", &out, nullptr))},
         {join, ZV_ERR_OVERFLOW, ZVT_CALL(zv_util_join(empties.data(), 65535, separator.c_str(), &out, &size))},
-        // The size just fits; allocating it fails.
+        // The size just fits, or fits with a separator to spare; allocating it fails.
         {join, kMem, ZVT_NULLS(char *, zv_util_join(empties.data(), 65535, separator.c_str() + 1, &o, &size)), "alloc"},
+        {join, kMem, ZVT_NULLS(char *, zv_util_join(empties.data(), 65534, separator.c_str() + 1, &o, &size)), "alloc"},
         {add, kNull, ZVT_CALL(zv_util_append_string(nullptr, &n, "xy", 1))},
         {add, kNull, ZVT_CALL(zv_util_append_string(&out, nullptr, "xy", 1))},
         {add, kNull, ZVT_CALL(zv_util_append_string(&out, &n, nullptr, 1))},
