@@ -137,8 +137,9 @@ TEST(Coders, WholeHugePagesOfLargeOutputBlocksAreAdvised)
     std::ostringstream pages;
     pages << std::hex << '\n' << ((first + page - 1) & -page) << '-' << ((first + zv::kHugeOutput) & -page);
     std::string smaps = zvt::get_file("/proc/self/smaps");
-    if (smaps.find("VmFlags") == smaps.npos || !std::ifstream("/sys/kernel/mm/transparent_hugepage/enabled"))
-        GTEST_SKIP() << "no huge pages, or no mapping flags to read";
+    // The 32-bit build runs emulated here, where advice is neither passed on nor shown.
+    if (sizeof(void *) < 8 || !std::ifstream("/sys/kernel/mm/transparent_hugepage/enabled"))
+        GTEST_SKIP() << "no huge pages, or an emulated 32-bit run";
     std::string flags = smaps.substr(smaps.find("VmFlags", smaps.find(pages.str() + ' ')));
     EXPECT_LT(flags.find(" hg"), flags.find('\n'));
 }
