@@ -330,6 +330,7 @@ TEST(Strings, AsprintfAllocatesExactlyTheMeasuredSizeAndWideTextUsesTheLocale)
     char *text = nullptr;
     int32_t err = -1;
     uint32_t size = 0;
+    EXPECT_TRUE(vsize(&size, "") == ZV_OK && size == 1) << "an empty text";
     ASSERT_EQ(zv_util_asprintf(&text, &err, "x=%d %s%%", 42, big.c_str()), ZV_OK);
     EXPECT_EQ(vsize(&size, "x=%d %s%%", 42, big.c_str()), ZV_OK);
     EXPECT_TRUE(text == expected && err == 0 && size == expected.size() + 1 && holds(text, size));
