@@ -72,10 +72,10 @@ TEST(Files, FailureTable)
     uint32_t n = 0;
     // A NULL between two checked pointers fails either || turned into &&.
     for (zv_status status :
-         {zv_util_open(nullptr, nullptr, 0, 0, "x"), zv_util_fopen(&stream, nullptr, nullptr, "x"),
-          zv_util_read_file(0, &buf, nullptr, nullptr), zv_util_get_file_size("x", nullptr),
-          zv_util_query_file_exists("x", nullptr), zv_util_read_named_file("x", nullptr, &n, 0),
-          zv_util_write_named_file("x", 1, nullptr, 0, nullptr), zv_util_copy_file("x", nullptr)})
+         {zv_util_open(nullptr, 0, 0, 0, kAbsent), zv_util_fopen(&stream, 0, nullptr, kAbsent),
+          zv_util_read_file(0, &buf, nullptr, 0), zv_util_read_named_file(kAbsent, nullptr, &n, 0),
+          zv_util_query_file_exists(kAbsent, nullptr), zv_util_get_file_size(kAbsent, nullptr),
+          zv_util_write_named_file(kAbsent, 1, nullptr, 0, 0), zv_util_copy_file(kAbsent, nullptr)})
         EXPECT_STATUS(ZV_ERR_NULL_ARG, status);
     zvt::ScratchDir dir;
     std::string f = dir / "f", big = dir / "big";
@@ -84,6 +84,7 @@ TEST(Files, FailureTable)
     ASSERT_EQ(ftruncate64(huge, (off64_t{1} << 32) + 1), 0);  // sparse, beyond 32 bits
     stream = fopen(f.c_str(), "a");
     lseek(fd, 7, SEEK_SET);  // where a failed line count must leave it
+    auto write = ZVT_CALL(zv_util_write_named_file(f.c_str(), 1, "data", 4, nullptr));
     auto read_fd = [&](int from) { return zv_util_read_file(from, &buf, &n, kErr); };
     // Where offsets are 32 bits every size query refuses 2 GiB or more; with
     // 64-bit offsets the descriptor read refuses 2 GiB, the named one 4 GiB.
@@ -108,8 +109,8 @@ TEST(Files, FailureTable)
          ZVT_CALL(zv_util_read_named_file(big.c_str(), &buf, &n, nullptr))},
         {"zv_util_read_named_file", kSys,  // the file ends before its measured size
          ZVT_CALL(zv_util_read_named_file(f.c_str(), &buf, &n, nullptr)), "fstat_grown"},
-        {"zv_util_write_named_file", kSys,
-         ZVT_CALL(zv_util_write_named_file(f.c_str(), 1, "data", 4, nullptr)), "ferror"},
+        {"zv_util_write_named_file", kSys, write, "ferror"},
+        {"zv_util_sync,zv_util_write_named_file", kSys, write, "fsync"},
         {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, kAbsent))},
         {"zv_util_sync_file", kSys, ZVT_CALL(zv_util_sync_file(f.c_str())), "fsync", 2,
          zvt::kUntouched, "Failed to sync directory file"},
