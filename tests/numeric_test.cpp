@@ -78,7 +78,7 @@ TEST(Prng, KnownSequencesFillsAndFailures)
         words(filled, start), words(stepped, start);
         const Words steps = words(stepped, count);
         const uint32_t length = 8 * count - 3 * (count & 1);
-        std::vector<unsigned char> out(8 * count + 16), expected(out.size());
+        std::vector<unsigned char> out(8 * count + 32), expected(out.size());
         std::memcpy(expected.data() + offset, steps.data(), length);
         ASSERT_EQ(zv_util_prng_fill(&filled, out.data() + offset, length), ZV_OK);
         ASSERT_TRUE(out == expected && words(filled) == words(stepped)) << start << " " << count;
