@@ -40,6 +40,7 @@ TEST(PidFile, Claims)
     uint32_t owner = 7;
     EXPECT_EQ(zv_util_claim_pid_file(path.c_str(), "any", &owner), ZV_OK);
 
+    // The holder's long command line does not fit a block cut too short for it.
     pid_t holder = zvt::start_sleeper(program), ended = zombie();
     // A claim under |name| of the file holding |content|: a refused claim
     // changes nothing, a granted one leaves the caller's ID alone in it.
