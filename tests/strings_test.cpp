@@ -19,7 +19,7 @@
 
 namespace {
 
-constexpr zv_status kNull = ZV_ERR_NULL_ARG, kMem = ZV_ERR_NO_MEMORY, kBad = ZV_ERR_BAD_VALUE;
+constexpr auto kNull = ZV_ERR_NULL_ARG, kMem = ZV_ERR_NO_MEMORY, kBad = ZV_ERR_BAD_VALUE, kOver = ZV_ERR_OVERFLOW;
 using zvt::kUntouched;
 
 // Whether |block| holds |bytes|. At sizes where the allocator leaves no slack
@@ -79,8 +79,7 @@ void expect_paths_agree(std::string (*code)(const std::string &, size_t), const 
 
 TEST(Coders, Base64AndHexKnownAnswersAndEveryPathAsScalar)
 {
-    const std::pair<std::string, std::string> rows[] = {
-        {"", ""},         {"f", "Zg=="},         {"fo", "Zm8="},         {"foo", "Zm9v"}, {"foob", "Zm9vYg=="},
+    const std::string rows[][2] = {{"", ""}, {"f", "Zg=="}, {"fo", "Zm8="}, {"foo", "Zm9v"}, {"foob", "Zm9vYg=="},
         {"fooba", "Zm9vYmE="}, {"foobar", "Zm9vYmFy"}, {"\xfb\xff", "+/8="}, {kAlphabetBytes, kAlphabet}};
     std::string every_byte, junk, salted;
     for (unsigned char c = 0; every_byte.size() < 256; every_byte += c++)
@@ -97,11 +96,11 @@ TEST(Coders, Base64AndHexKnownAnswersAndEveryPathAsScalar)
             EXPECT_EQ(decode(text.substr(0, text.find('='))), bytes) << "unpadded";
             EXPECT_EQ(zv_util_to_base64_size(bytes.size()), text.size());
         }
-        EXPECT_EQ(decode(salted + junk + kAlphabet, 64), kAlphabetBytes + kAlphabetBytes);
+        // A lone final value carries no byte.
+        EXPECT_EQ(decode(salted + junk + kAlphabet + "Y", 64), kAlphabetBytes + kAlphabetBytes);
         for (char c : junk)
             for (size_t at : {0, 15, 16, 31, 47, 64})
                 ASSERT_EQ(decode(std::string(kAlphabet).insert(at, 1, c)), kAlphabetBytes) << int(c) << "@" << at;
-        EXPECT_EQ(decode("Zm9vY"), "foo") << "a lone final value carries no byte";
     });
     EXPECT_TRUE(zv_util_to_base64_size(3221225469u) == 4294967292u && zv_util_to_base64_size(3221225470u) == 0);
     std::mt19937 random(1);
@@ -226,8 +225,7 @@ TEST(Strings, FailureTable)
         {"", kMem, ZVT_NULLS(char *, zv_util_base64_encode("", 3221225469u, &o, &n)), "alloc"},
         {"", kMem, ZVT_NULLS(uint8_t *, zv_util_base64_decode("Zg", 2, &o, &n)), "alloc"},
         {scan, kBad, ZVT_NULLS(uint8_t *, zv_util_sscanf_bytes("g0", 2, &o))},
-        {scan, kBad, ZVT_NULLS(uint8_t *, zv_util_sscanf_bytes("0G", 2, &o))},
-        {scan, kBad, ZVT_NULLS(uint8_t *, zv_util_sscanf_bytes(":0", 2, &o))},
+        {scan, kBad, ZVT_NULLS(uint8_t *, zv_util_sscanf_bytes("0:", 2, &o))},
         {scan, kMem, ZVT_NULLS(uint8_t *, zv_util_sscanf_bytes("01", 2, &o)), "alloc", 1, kUntouched, log},
         {print, kMem, ZVT_NULLS(char *, zv_util_sprintf_bytes("", 1, &o)), "alloc", 1, kUntouched, log},
         // From 2^31 bytes on the text would not fit 32 bits.
@@ -243,7 +241,7 @@ TEST(Strings, FailureTable)
         {join, kNull, ZVT_CALL(zv_util_join(strings, 1, nullptr, &out, &size))},
         {join, kNull, ZVT_CALL(zv_util_join(strings, 1, ",", nullptr, &size))},
         {join, kNull, ZVT_CALL(zv_util_join(strings, 1, ",", &out, nullptr))},
-        {join, ZV_ERR_OVERFLOW, ZVT_CALL(zv_util_join(empties.data(), 65535, sep.c_str(), &out, &size))},
+        {join, kOver, ZVT_CALL(zv_util_join(empties.data(), 65535, sep.c_str(), &out, &size))},
         // The size just fits, or fits with a separator to spare; allocating it fails.
         {join, kMem, ZVT_NULLS(char *, zv_util_join(empties.data(), 65535, sep.c_str() + 1, &o, &size)), "alloc"},
         {join, kMem, ZVT_NULLS(char *, zv_util_join(empties.data(), 65534, sep.c_str() + 1, &o, &size)), "alloc"},
@@ -253,7 +251,7 @@ TEST(Strings, FailureTable)
         {add, kBad, ZVT_CALL(zv_util_append_string(&out, &n, "xy", 0))},
         {add, kBad, ZVT_CALL(zv_util_append_string(&out, &lengths[0], "xy", 1))},
         // The new length and its NUL: one past 32 bits, then just fitting.
-        {add, ZV_ERR_OVERFLOW, ZVT_CALL(zv_util_append_string(&out, &lengths[1], "xy", 2))},
+        {add, kOver, ZVT_CALL(zv_util_append_string(&out, &lengths[1], "xy", 2))},
         {add, kMem, ZVT_CALL(zv_util_append_string(&out, &lengths[2], "xy", 2)), "alloc"},
         {vas, kNull, ZVT_CALL(zv_util_asprintf(nullptr, &zvt::row_errno, "x"))},
         {vas, kNull, ZVT_CALL(zv_util_asprintf(&out, &zvt::row_errno, no_format))},
@@ -271,6 +269,11 @@ TEST(Strings, FailureTable)
         {wchar, kBad, convert, "mbsrtowcs", 2},
         {wchar, ZV_ERR_TOO_SMALL, convert, "mbsrtowcs_short"},
     });
+    // 65535 strings of 65537 characters and no separator: 2^32 - 1 characters and
+    // no room for the NUL. Reading 4 GiB is too slow under emulation.
+    std::vector<const char *> pieces(65535, sep.c_str() + 1);
+    if (sizeof(void *) == 8)
+        zvt::expect_failures({{join, kOver, ZVT_CALL(zv_util_join(pieces.data(), 65535, "", &out, &size))}});
     EXPECT_TRUE(out == (void *)fields && out == (void *)wide && n == 7 && lengths[2] == UINT32_MAX - 3);
     for (int k = 0; k < 4; k++) {
         const void *a[] = {"a,b", ",", &fields, &n};
@@ -345,7 +348,7 @@ TEST(Strings, AsprintfAllocatesExactlyTheMeasuredSizeAndWideTextUsesTheLocale)
     for (uint32_t i = 0, count; i < 16; multibyte += pieces[i % 4], wide += wides[i++ % 4]) {
         wchar_t *out = nullptr;
         ASSERT_EQ(zv_util_char_to_wchar(multibyte.c_str(), 12345, &out, &count), ZV_OK);
-        EXPECT_TRUE(std::wstring(out, count + 1) == wide + L'\0' && holds(out, (count + 1) * sizeof(wchar_t))) << i;
+        EXPECT_TRUE(std::wstring(out, count + 1) == wide + L'\0' && holds(out, (count + 1) * sizeof(wchar_t)));
         std::free(out);
     }
     std::setlocale(LC_CTYPE, saved.c_str());
