@@ -3,60 +3,57 @@
 #include <gtest/gtest.h>
 #include <zverrortrace.h>
 
-#include <cerrno>
+#include <cstdarg>
 #include <cstring>
+#include <cwchar>
 #include <dirent.h>
+#include <fcntl.h>
+#include <filesystem>
+#include <grp.h>
 #include <malloc.h>
-#include <string>
-#include <unistd.h>
-#include <vector>
+#include <signal.h>
+#include <sys/stat.h>
+#include <sys/time.h>
+
+#include "support/wrap_time.h"
 
 #if defined(__SANITIZE_ADDRESS__)
 extern "C" size_t __sanitizer_get_current_allocated_bytes(void);
 #endif
+// The names of the points the wrappers serve, gathered by the linker (see HIT).
+extern "C" const char *const __start_zvt_points[], *const __stop_zvt_points[];
 
 namespace zvt {
 namespace {
 
 struct Rule {
     const char *point;
-    unsigned nth;
-    unsigned extra;
+    unsigned nth, extra, calls;
     int err;
-    unsigned calls;
-};
-
-constexpr unsigned kMaxRules = 8;
-Rule rules[kMaxRules];
-unsigned rule_count;
+} rules[8];
+unsigned rule_count, open_count;
 bool fired;
+OpenCall opens[64];
+std::optional<timespec> pinned;
+
+bool known(const char *point)
+{
+    for (const char *const *name = __start_zvt_points; name != __stop_zvt_points; name++)
+        if (std::strcmp(*name, point) == 0)
+            return true;
+    if (std::strcmp(point, kNoFault) != 0)
+        ADD_FAILURE() << "no wrapper serves the fault point \"" << point << "\"";
+    return false;
+}
 
 #if !defined(__SANITIZE_ADDRESS__)
-// glibc's count of heap in use includes blocks parked in the per-thread cache,
-// so a freed block would look leaked. Run the tests with that cache off:
-// the tunable is read at start-up, hence the re-exec.
-constexpr char kTunables[] = "glibc.malloc.tcache_count=0";
-
-[[maybe_unused]] const bool tcache_off = [] {
-    const char *current = getenv("GLIBC_TUNABLES");
-    if (current != nullptr && std::strstr(current, kTunables) != nullptr)
-        return true;
-    FILE *cmdline = fopen("/proc/self/cmdline", "r");
-    if (cmdline == nullptr)
-        return false;
-    std::string all;
-    char chunk[4096];
-    size_t n;
-    while ((n = fread(chunk, 1, sizeof chunk, cmdline)) > 0)
-        all.append(chunk, n);
-    fclose(cmdline);
-    std::vector<char *> argv;
-    for (size_t at = 0; at < all.size(); at += std::strlen(&all[at]) + 1)
-        argv.push_back(&all[at]);
-    argv.push_back(nullptr);
-    setenv("GLIBC_TUNABLES", kTunables, 1);
-    execv("/proc/self/exe", argv.data());
-    return false;
+// glibc counts a block parked in its per-thread cache as in use, so the leak
+// checks need that cache off, as ctest's environment has it.
+const bool cache_off = [] {
+    void *volatile block = std::malloc(100);
+    size_t held = mallinfo2().uordblks;
+    std::free(block);
+    return mallinfo2().uordblks < held;
 }();
 #endif
 
@@ -64,62 +61,69 @@ constexpr char kTunables[] = "glibc.malloc.tcache_count=0";
 
 void fault_arm(const char *point, unsigned nth, int err, unsigned count)
 {
-    if (rule_count == kMaxRules)
-        std::abort();
-    rules[rule_count++] = Rule{point, nth, count, err, 0};
     fired = false;
+    EXPECT_LT(rule_count, std::size(rules)) << "too many points armed";
+    if (known(point) && rule_count < std::size(rules))
+        rules[rule_count++] = Rule{point, nth, count, 0, err};
 }
 
-void fault_clear()
-{
-    rule_count = 0;
-}
+void fault_clear() { rule_count = 0; }
 
 bool fault_fired() { return fired; }
 
 unsigned fault_calls(const char *point)
 {
-    for (unsigned i = 0; i < rule_count; i++)
+    for (unsigned i = 0; known(point) && i < rule_count; i++)
         if (std::strcmp(rules[i].point, point) == 0)
             return rules[i].calls;
     return 0;
 }
 
+// For the wrappers: true when this call must fail; errno is then already set.
 bool fault_hit(const char *point)
 {
-    for (unsigned i = 0; i < rule_count; i++) {
-        Rule &r = rules[i];
-        if (std::strcmp(r.point, point) != 0)
-            continue;
-        unsigned call = ++r.calls;
-        if (call >= r.nth && (r.extra == ~0u || call - r.nth <= r.extra)) {
-            fired = true;
-            errno = r.err;
-            return true;
-        }
-    }
+    for (Rule *r = rules; r != rules + rule_count; r++)
+        if (std::strcmp(r->point, point) == 0 && ++r->calls >= r->nth &&
+            (r->extra == ~0u || r->calls - r->nth <= r->extra))
+            return fired = true, errno = r->err, true;
     return false;
 }
+
+void log_open(const char *function, const char *path, int flags, const char *mode)
+{
+    if (open_count < std::size(opens)) {
+        OpenCall &call = opens[open_count];
+        std::strncpy(call.function, function, sizeof call.function - 1);
+        std::strncpy(call.path, path != nullptr ? path : "", sizeof call.path - 1);
+        std::strncpy(call.mode, mode != nullptr ? mode : "", sizeof call.mode - 1);
+        call.flags = flags;
+    }
+    open_count++;
+}
+
+void open_log_clear() { open_count = 0; }
+
+std::vector<OpenCall> open_log()
+{
+    EXPECT_LE(open_count, std::size(opens)) << "the open log overflowed";
+    return {opens, opens + std::min<size_t>(open_count, std::size(opens))};
+}
+
+void pin_clock(std::optional<timespec> now) { pinned = now; }
 
 size_t heap_in_use()
 {
 #if defined(__SANITIZE_ADDRESS__)
     return __sanitizer_get_current_allocated_bytes();
 #else
+    EXPECT_TRUE(cache_off) << "glibc's per-thread cache is on: run through ctest";
     return mallinfo2().uordblks;
 #endif
 }
 
 unsigned open_fd_count()
 {
-    unsigned n = 0;
-    DIR *dir = opendir("/proc/self/fd");
-    if (dir == nullptr)
-        return 0;
-    while (readdir(dir) != nullptr)
-        n++;
-    closedir(dir);
-    return n;
+    return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
 }
 
 void sweep_allocations(const std::function<bool()> &call,
@@ -127,27 +131,134 @@ void sweep_allocations(const std::function<bool()> &call,
 {
     // A first plain run settles one-time allocations and must succeed.
     ASSERT_TRUE(call()) << "the call fails without any injected fault";
-    for (unsigned nth = 1; nth < 10000; nth++) {
+    for (unsigned nth = 1; !::testing::Test::HasFailure(); nth++) {
         zv_trace_clear();
-        size_t heap_before = heap_in_use();
-        unsigned fds_before = open_fd_count();
-        fault_arm("alloc", nth, ENOMEM);
-        bool ok = call();
-        bool hit = fault_fired();
-        fault_clear();
-        if (!hit) {
-            EXPECT_TRUE(ok) << "succeeded after " << nth - 1 << " allocation failures";
-            EXPECT_GT(nth, 1u) << "the call made no allocation";
+        size_t heap = heap_in_use();
+        unsigned fds = open_fd_count();
+        bool ok = with_fault("alloc", nth, ENOMEM, call);
+        if (!fired) {
+            EXPECT_TRUE(ok && nth > 1) << "no success, or no allocation, after " << nth - 1;
             return;
         }
         EXPECT_FALSE(ok) << "allocation " << nth << " failed, yet the call reported success";
-        EXPECT_EQ(heap_before, heap_in_use()) << "heap leaked when allocation " << nth << " failed";
-        EXPECT_EQ(fds_before, open_fd_count()) << "descriptor leaked at allocation " << nth;
+        EXPECT_EQ(heap, heap_in_use()) << "heap leaked when allocation " << nth << " failed";
+        EXPECT_EQ(fds, open_fd_count()) << "descriptor leaked at allocation " << nth;
         check_failure(nth);
-        if (::testing::Test::HasFailure())
-            return;
     }
-    FAIL() << "the call never stopped allocating";
 }
 
+// Every test starts with an empty trace and open log and no armed fault.
+struct Reset : ::testing::EmptyTestEventListener {
+    void OnTestStart(const ::testing::TestInfo &) override
+    {
+        fault_clear();
+        open_log_clear();
+        zv_trace_clear();
+    }
+};
+[[maybe_unused]] const bool reset_registered =
+    (::testing::UnitTest::GetInstance()->listeners().Append(new Reset), true);
+
 }  // namespace zvt
+
+// HIT(point) answers whether this call must fail, and puts |point| among the
+// names fault_arm accepts.
+#define HIT(point)                                                                        \
+    [] {                                                                                  \
+        [[gnu::used, gnu::section("zvt_points")]] static const char *const name = point; \
+        return zvt::fault_hit(name);                                                      \
+    }()
+
+// __wrap_FN returns |fail| when |point| fires, and the value of |...| otherwise
+// (which calls __real_FN, FN itself).
+#define WRAP(fn, type, params, point, fail, ...) \
+    type __real_##fn params;                     \
+    type __wrap_##fn params { return HIT(point) ? fail : __VA_ARGS__; }
+
+extern "C" {
+
+WRAP(malloc, void *, (size_t a), "alloc", nullptr, __real_malloc(a))
+WRAP(calloc, void *, (size_t a, size_t b), "alloc", nullptr, __real_calloc(a, b))
+WRAP(strndup, char *, (const char *a, size_t b), "alloc", nullptr, __real_strndup(a, b))
+// "read_idle" and "write_idle" make a call return 0 without moving a byte.
+WRAP(read, ssize_t, (int a, void *b, size_t c), "read", -1,
+     HIT("read_idle") ? 0 : __real_read(a, b, c))
+WRAP(write, ssize_t, (int a, const void *b, size_t c), "write", -1,
+     HIT("write_idle") ? 0 : __real_write(a, b, c))
+WRAP(fsync, int, (int a), "fsync", -1, __real_fsync(a))
+WRAP(lseek, off_t, (int a, off_t b, int c), "lseek", -1, __real_lseek(a, b, c))
+// "fstat_grown" reports a file 100 bytes larger than it is, as if it had
+// shrunk since it was measured.
+WRAP(fstat64, int, (int a, struct stat64 *b), "fstat", -1,
+     __real_fstat64(a, b) != 0 ? -1 : HIT("fstat_grown") ? (b->st_size += 100, 0) : 0)
+// "stat_wide_inode" reports an inode number beyond 32 bits, as XFS, btrfs and
+// overlay file systems do.
+WRAP(stat64, int, (const char *a, struct stat64 *b), "stat", -1,
+     __real_stat64(a, b) != 0 ? -1 : HIT("stat_wide_inode") ? (b->st_ino |= 1ull << 40, 0) : 0)
+// A failed transfer sets the stream's error indicator, as glibc does; an armed
+// "ferror" reports it set; a failing fclose still releases the stream.
+WRAP(fwrite, size_t, (const void *a, size_t b, size_t c, FILE *d), "fwrite",
+     (d->_flags |= _IO_ERR_SEEN, 0), __real_fwrite(a, b, c, d))
+WRAP(fread, size_t, (void *a, size_t b, size_t c, FILE *d), "fread",
+     (d->_flags |= _IO_ERR_SEEN, 0), __real_fread(a, b, c, d))
+WRAP(fflush, int, (FILE *a), "fflush", EOF, __real_fflush(a))
+WRAP(ferror, int, (FILE *a), "ferror", 1, __real_ferror(a))
+WRAP(fileno, int, (FILE *a), "fileno", -1, __real_fileno(a))
+WRAP(fclose, int, (FILE *a), "fclose",
+     ([&, e = errno] { return __real_fclose(a), errno = e, EOF; }()), __real_fclose(a))
+WRAP(opendir, DIR *, (const char *a), "opendir", nullptr, __real_opendir(a))
+WRAP(scandir64, int,
+     (const char *a, dirent64 ***b, int (*c)(const dirent64 *),
+      int (*d)(const dirent64 **, const dirent64 **)),
+     "scandir", -1, __real_scandir64(a, b, c, d))
+WRAP(getgrnam_r, int, (const char *a, group *b, char *c, size_t d, group **e), "getgrnam_r",
+     (*e = nullptr, errno), __real_getgrnam_r(a, b, c, d, e))
+WRAP(setegid, int, (gid_t a), "setegid", -1, __real_setegid(a))
+WRAP(sysconf, long, (int a), "sysconf", -1, __real_sysconf(a))
+WRAP(gethostname, int, (char *a, size_t b), "gethostname", -1, __real_gethostname(a, b))
+WRAP(vsnprintf, int, (char *a, size_t b, const char *c, va_list d), "vsnprintf", -1,
+     __real_vsnprintf(a, b, c, d))
+// "mbsrtowcs_short" cuts a conversion into a buffer one wide character short,
+// as a locale changed between measuring and converting would.
+WRAP(mbsrtowcs, size_t, (wchar_t *a, const char **b, size_t c, mbstate_t *d), "mbsrtowcs",
+     size_t(-1), __real_mbsrtowcs(a, b, c - (a != nullptr && c > 0 && HIT("mbsrtowcs_short")), d))
+WRAP(fork, pid_t, (void), "fork", -1, __real_fork())
+WRAP(waitpid, pid_t, (pid_t a, int *b, int c), "waitpid", -1, __real_waitpid(a, b, c))
+WRAP(sigaction, int, (int a, const struct sigaction *b, struct sigaction *c), "sigaction", -1,
+     __real_sigaction(a, b, c))
+WRAP(flock, int, (int a, int b), "flock", -1, __real_flock(a, b))
+// While a clock is pinned, the wall-clock readings answer it.
+WRAP(clock_gettime, int, (clockid_t a, timespec *b), "clock_gettime", -1,
+     zvt::pinned && a == CLOCK_REALTIME ? (*b = *zvt::pinned, 0) : __real_clock_gettime(a, b))
+WRAP(gettimeofday, int, (timeval *a, void *b), "gettimeofday", -1,
+     zvt::pinned ? (*a = {zvt::pinned->tv_sec, zvt::pinned->tv_nsec / 1000}, 0)
+                 : __real_gettimeofday(a, b))
+WRAP(time, time_t, (time_t *a), "time", -1,
+     !zvt::pinned ? __real_time(a) : a != nullptr ? *a = zvt::pinned->tv_sec : zvt::pinned->tv_sec)
+WRAP(localtime_r, tm *, (const time_t *a, tm *b), "localtime_r", nullptr, __real_localtime_r(a, b))
+WRAP(gmtime_r, tm *, (const time_t *a, tm *b), "gmtime_r", nullptr, __real_gmtime_r(a, b))
+WRAP(asctime_r, char *, (const tm *a, char *b), "asctime_r", nullptr, __real_asctime_r(a, b))
+// A failed ctime_r leaves 26 bytes without a terminator, the worst a caller
+// could be handed.
+WRAP(ctime_r, char *, (const time_t *a, char *b), "ctime_r",
+     (std::memset(b, '#', 26), nullptr), __real_ctime_r(a, b))
+// The open calls the library makes also go to the open log.
+FILE *__real_fopen(const char *path, const char *mode);
+FILE *__wrap_fopen(const char *path, const char *mode)
+{
+    zvt::log_open("fopen", path, -1, mode);
+    return HIT("fopen") ? nullptr : __real_fopen(path, mode);
+}
+
+int __real_open(const char *path, int flags, ...);
+int __wrap_open(const char *path, int flags, ...)
+{
+    va_list args;
+    va_start(args, flags);
+    mode_t mode = __OPEN_NEEDS_MODE(flags) ? va_arg(args, unsigned) : 0;
+    va_end(args);
+    zvt::log_open("open", path, flags, "");
+    return HIT("open") ? -1 : __real_open(path, flags, mode);
+}
+
+}  // extern "C"

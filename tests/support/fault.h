@@ -1,20 +1,22 @@
 // Fault injection: the test executable links the library's archive with
-// -Wl,--wrap=NAME for every __wrap_NAME in support/wrap_*.cpp, so calls the
-// library makes to those functions pass through here. A wrapper asks
-// fault_hit() with its point name ("alloc" for every allocation function, the
-// function's own name otherwise) and fails with the armed errno when told to.
-//
-// Arming covers every caller in the executable, the test's own code included,
-// so arm right before the call under test and clear right after it
-// (with_fault does both).
+// -Wl,--wrap=NAME for every function support/fault.cpp wraps, so calls to it
+// (the test's own included) pass through a wrapper that fails with the armed
+// errno when its point fires. Points are named after the function ("alloc"
+// for every allocation); a name no wrapper serves fails the test. Arming
+// covers every caller, so arm right before the call under test and clear
+// right after it (with_fault does both).
 #pragma once
 
 #include <functional>
 #include <utility>
+#include <vector>
 
 #include <zvutil/status.h>
 
 namespace zvt {
+
+// The point name that arms nothing.
+inline constexpr const char *kNoFault = "none";
 
 // The |nth| call (1-based, counted from now) at |point| fails with |err|;
 // |count| further calls fail after it (0: only that one; ~0u: all later ones).
@@ -25,9 +27,6 @@ bool fault_fired();
 // Calls seen at |point| since it was armed.
 unsigned fault_calls(const char *point);
 
-// For wrappers: true when this call must fail; errno is then already set.
-bool fault_hit(const char *point);
-
 template <class F>
 auto with_fault(const char *point, unsigned nth, int err, F &&call)
 {
@@ -36,6 +35,13 @@ auto with_fault(const char *point, unsigned nth, int err, F &&call)
     fault_clear();
     return result;
 }
+
+// Every open and fopen call (the two the library's archive makes), recorded by
+// its wrapper without heap use: |flags| are the open flags (-1 for fopen),
+// |mode| is fopen's mode ("" for open). Each test starts with an empty log.
+struct OpenCall { char function[16]; char path[256]; int flags; char mode[8]; };
+void open_log_clear();
+std::vector<OpenCall> open_log();  // calls since the last clear, oldest first
 
 // Bytes of heap in use (glibc's count, or the sanitizer allocator's).
 size_t heap_in_use();

@@ -8,19 +8,14 @@
 
 namespace zvt {
 
-inline constexpr uint32_t kFeaturePaths[] = {
-    ~0u, zv::cpu::kSSE2 | zv::cpu::kSSSE3, zv::cpu::kSSE2, 0};
-
 template <typename Check>
 void for_each_feature_path(Check check)
 {
-    struct Restore {
-        ~Restore() { zv::cpu::restrict(~0u); }
-    } restore;
-    for (uint32_t mask : kFeaturePaths) {
+    for (uint32_t mask : {~0u, zv::cpu::kSSE2 | zv::cpu::kSSSE3, +zv::cpu::kSSE2, 0u}) {
         zv::cpu::restrict(mask);
         check(mask);
     }
+    zv::cpu::restrict(~0u);
 }
 
 }  // namespace zvt

@@ -1,17 +1,11 @@
-// Scratch directories, forked children and a failure-table driver for the
-// file, directory and group tests.
+// Scratch directories, forked children and the failure-row driver.
 #pragma once
 
 #include <gtest/gtest.h>
 
-#include <cerrno>
-#include <cstdio>
 #include <filesystem>
 #include <fstream>
-#include <functional>
 #include <grp.h>
-#include <sstream>
-#include <string>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -28,11 +22,9 @@ inline constexpr gid_t kNogroup = 65534;
 // child can work in it; removed with its content at the end.
 class ScratchDir {
 public:
-    ScratchDir()
+    ScratchDir() : path_(mkdtemp(std::string("/tmp/zvutil-test-XXXXXX").data()))
     {
-        char pattern[] = "/tmp/zvutil-test-XXXXXX";
-        path_ = mkdtemp(pattern);
-        [[maybe_unused]] int ignored = chown(pattern, kNobody, kNogroup);
+        [[maybe_unused]] int ignored = chown(path_.c_str(), kNobody, kNogroup);
     }
     ~ScratchDir()
     {
@@ -53,9 +45,7 @@ inline void put_file(const std::string &path, const std::string &content)
 
 inline std::string get_file(const std::string &path)
 {
-    std::ostringstream all;
-    all << std::ifstream(path, std::ios::binary).rdbuf();
-    return all.str();
+    return {std::istreambuf_iterator<char>(std::ifstream(path, std::ios::binary).rdbuf()), {}};
 }
 
 // Runs |body| in a forked child, as the unprivileged user when |drop|; the
@@ -85,16 +75,16 @@ inline void in_child(bool drop, const std::function<void()> &body)
 inline constexpr int32_t kUntouched = 12345;
 inline int32_t row_errno = kUntouched;
 
-// One failure: |call|, with the |nth| call at |point| failing with EIO when a
-// point is named, returns |status|; the trace holds the comma-separated
-// |frames| (oldest first, each with |status|); |row_errno| ends as |err|; the
-// log holds |log| alone (level 3, written after |log_after| frames) or
-// nothing; no descriptor or heap block is left behind.
+// One failure: |call|, with the |nth| call at |point| failing with EIO,
+// returns |status|; the trace holds the comma-separated |frames| (oldest
+// first, each with |status|); |row_errno| ends as |err|; the log holds |log|
+// alone (level 3, written after |log_after| frames) or nothing; no descriptor
+// or heap block is left behind. A null point arms nothing, as kNoFault.
 struct FailureRow {
     const char *frames;
     zv_status status;
     std::function<zv_status()> call;
-    const char *point = nullptr;
+    const char *point = kNoFault;
     unsigned nth = 1;
     int32_t err = kUntouched;
     std::string log = "";
@@ -104,35 +94,30 @@ struct FailureRow {
 inline void expect_failures(std::initializer_list<FailureRow> rows)
 {
     for (const FailureRow &row : rows) {
-        SCOPED_TRACE(std::string(row.frames) + " / " + (row.point ? row.point : "real") +
-                     std::to_string(row.nth));
+        const char *point = row.point ? row.point : kNoFault;
+        SCOPED_TRACE(std::string(row.frames) + " / " + point + " " + std::to_string(row.nth));
         clear_trace();
         row_errno = kUntouched;
         size_t heap = heap_in_use();
         unsigned fds = open_fd_count();
         LogCapture log;
-        if (row.point != nullptr)
-            fault_arm(row.point, row.nth, EIO);
-        zv_status status = row.call();
-        fault_clear();
+        zv_status status = with_fault(point, row.nth, EIO, row.call);
         EXPECT_EQ(heap_in_use(), heap);
         EXPECT_EQ(open_fd_count(), fds);
         EXPECT_STATUS(row.status, status);
-        std::string names;
+        std::string names, lines, want;
         for (const Frame &frame : frames()) {
             names += (names.empty() ? "" : ",") + frame.function;
             EXPECT_STATUS(row.status, frame.status);
         }
         EXPECT_EQ(names, row.frames);
         EXPECT_EQ(row_errno, row.err);
-        std::vector<LogLine> lines = log.lines();
-        EXPECT_EQ(lines.size(), row.log.empty() ? 0u : 1u);
-        if (!lines.empty()) {
-            EXPECT_EQ(lines[0].message, row.log);
-            EXPECT_EQ(lines[0].level, 3);
-            EXPECT_EQ(lines[0].mask, 128u);
-            EXPECT_EQ(lines[0].frames_before, row.log_after);
-        }
+        for (const LogLine &l : log.lines())
+            lines += std::to_string(l.level) + "/" + std::to_string(l.mask) + "/" +
+                     std::to_string(l.frames_before) + " " + l.message + "\n";
+        if (!row.log.empty())
+            want = "3/128/" + std::to_string(row.log_after) + " " + row.log + "\n";
+        EXPECT_EQ(lines, want) << "log lines as level/mask/frames before";
     }
 }
 

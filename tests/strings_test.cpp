@@ -1,0 +1,357 @@
+// Base64 and hexadecimal text and their output blocks; splitting, joining and
+// appending strings; memory primitives; formatted allocation; wide conversion.
+#include <gtest/gtest.h>
+#include <malloc.h>
+
+#include <clocale>
+#include <cstring>
+#include <random>
+
+#include "output_block.h"
+#include "support/feature_paths.h"
+#include "support/scratch.h"
+#include <zvutil/base64.h>
+#include <zvutil/convert.h>
+#include <zvutil/format.h>
+#include <zvutil/hex.h>
+#include <zvutil/memory.h>
+#include <zvutil/string_ops.h>
+
+namespace {
+
+constexpr auto kNull = ZV_ERR_NULL_ARG, kMem = ZV_ERR_NO_MEMORY, kBad = ZV_ERR_BAD_VALUE, kOver = ZV_ERR_OVERFLOW;
+using zvt::kUntouched;
+
+// Whether |block| holds |bytes|. At sizes where the allocator leaves no slack
+// this shows a block one byte short without the sanitizer too.
+bool holds(const void *block, size_t bytes) { return malloc_usable_size(const_cast<void *>(block)) >= bytes; }
+
+constexpr char kAlphabet[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+// The 48 bytes whose Base64 text is the alphabet in order.
+const std::string kAlphabetBytes(
+    "\x00\x10\x83\x10\x51\x87\x20\x92\x8b\x30\xd3\x8f\x41\x14\x93\x51\x55\x97\x61\x96\x9b\x71\xd7\x9f"
+    "\x82\x18\xa3\x92\x59\xa7\xa2\x9a\xab\xb2\xdb\xaf\xc3\x1c\xb3\xd3\x5d\xb7\xe3\x9e\xbb\xf3\xdf\xbf",
+    48);
+
+// |code| run on a copy of |in| followed by |pad| alphabet characters, which
+// change the output of a read past |in|; without them such reads show under the
+// sanitizer. Returns the output, after checking that the output block holds it.
+template <class Out, class Code>
+std::string coded(Code code, const std::string &in, size_t pad)
+{
+    std::vector<char> block(in.begin(), in.end());
+    block.resize(in.size() + pad, 'A');
+    Out *out = nullptr;
+    uint32_t n = 0;
+    EXPECT_EQ(code(block.data(), static_cast<uint32_t>(in.size()), &out, &n), ZV_OK);
+    std::string result(reinterpret_cast<char *>(out), n);
+    EXPECT_TRUE(holds(out, n));
+    std::free(out);
+    return result;
+}
+
+std::string encode(const std::string &s, size_t pad = 0) { return coded<char>(zv_util_base64_encode, s, pad); }
+std::string decode(const std::string &s, size_t pad = 0) { return coded<uint8_t>(zv_util_base64_decode, s, pad); }
+zv_status print_hex(const char *bytes, uint32_t n, char **out, uint32_t *length)
+{
+    *length = 2 * n + 1;  // the NUL too
+    return zv_util_sprintf_bytes(bytes, n, out);
+}
+std::string hex(const std::string &s, size_t pad = 0) { return coded<char>(print_hex, s, pad); }
+
+// Every processor path codes inputs of every length up to 140 and a few longer
+// ones, every other one padded, as the scalar path does; |pick(n)| draws the
+// characters of the input of length n.
+void expect_paths_agree(std::string (*code)(const std::string &, size_t), const std::function<char(size_t)> &pick)
+{
+    std::vector<std::string> ins, scalar;
+    for (size_t n = 0; n < 1100; n += n < 140 ? 1 : 239)
+        for (ins.emplace_back(); ins.back().size() < n;)
+            ins.back() += pick(n);
+    zv::cpu::restrict(0);
+    for (size_t k = 0; k < ins.size(); k++)
+        scalar.push_back(code(ins[k], k % 2 * 64));
+    zvt::for_each_feature_path([&](uint32_t features) {
+        for (size_t k = 0; k < ins.size(); k++)
+            ASSERT_EQ(code(ins[k], k % 2 * 64), scalar[k]) << "features " << features << ", input " << k;
+    });
+}
+
+TEST(Coders, Base64AndHexKnownAnswersAndEveryPathAsScalar)
+{
+    const std::string rows[][2] = {{"", ""}, {"f", "Zg=="}, {"fo", "Zm8="}, {"foo", "Zm9v"}, {"foob", "Zm9vYg=="},
+        {"fooba", "Zm9vYmE="}, {"foobar", "Zm9vYmFy"}, {"\xfb\xff", "+/8="}, {kAlphabetBytes, kAlphabet}};
+    std::string every_byte, junk, salted;
+    for (unsigned char c = 0; every_byte.size() < 256; every_byte += c++)
+        if (!std::memchr(kAlphabet, c, 64))
+            junk += c;  // '=' and NUL among them
+    // 0, 2, 4 or 6 junk characters after each alphabet character use up the junk.
+    for (size_t i = 0, used = 0; i < 64; used += 2 * (i % 4), i++)
+        salted += kAlphabet[i] + junk.substr(used, 2 * (i % 4));
+    zvt::for_each_feature_path([&](uint32_t features) {
+        SCOPED_TRACE(features);
+        for (const auto &[bytes, text] : rows) {
+            EXPECT_EQ(encode(bytes), text);
+            EXPECT_EQ(decode(text), bytes);
+            EXPECT_EQ(decode(text.substr(0, text.find('='))), bytes) << "unpadded";
+            EXPECT_EQ(zv_util_to_base64_size(bytes.size()), text.size());
+        }
+        // A lone final value carries no byte.
+        EXPECT_EQ(decode(salted + junk + kAlphabet + "Y", 64), kAlphabetBytes + kAlphabetBytes);
+        for (char c : junk)
+            for (size_t at : {0, 15, 16, 31, 47, 64})
+                ASSERT_EQ(decode(std::string(kAlphabet).insert(at, 1, c)), kAlphabetBytes) << int(c) << "@" << at;
+    });
+    EXPECT_TRUE(zv_util_to_base64_size(3221225469u) == 4294967292u && zv_util_to_base64_size(3221225470u) == 0);
+    std::mt19937 random(1);
+    expect_paths_agree(encode, [&](size_t) { return static_cast<char>(random()); });
+    // Alphabet text with '=', line breaks or another byte at a density set by the length.
+    unsigned percent[] = {0, 2, 10, 50};
+    expect_paths_agree(decode, [&](size_t n) {
+        return random() % 100 >= percent[n % 4] ? kAlphabet[random() % 64] : "=\n\r\x80"[random() % 4];
+    });
+
+    // Hexadecimal text: lower-case pairs, read back in either case; an odd last
+    // digit is ignored.
+    uint8_t *bytes = nullptr;
+    std::string text = hex(every_byte);
+    EXPECT_EQ(text.find_first_not_of("0123456789abcdef"), 512u);
+    text = text.substr(0, 512) + "0123456789ABCDEFz";
+    ASSERT_EQ(zv_util_sscanf_bytes(text.data(), text.size(), &bytes), ZV_OK);
+    EXPECT_EQ(std::string(reinterpret_cast<char *>(bytes), 264), every_byte + "\x01\x23\x45\x67\x89\xab\xcd\xef");
+    std::free(bytes);
+    expect_paths_agree(hex, [&](size_t) { return static_cast<char>(random()); });
+    char printed[1200] = {};
+    FILE *stream = fmemopen(printed, sizeof printed, "w");
+    EXPECT_EQ(zv_util_fprintf_bytes(stream, text.data(), text.size()), ZV_OK);  // in several chunks
+    std::fclose(stream);
+    EXPECT_EQ(printed + std::string(1, '\0'), hex(text));
+}
+
+TEST(Coders, WholeHugePagesOfLargeOutputBlocksAreAdvised)
+{
+    std::unique_ptr<void, decltype(&std::free)> block(zv::malloc_output(zv::kHugeOutput), std::free);
+    // The advice splits off a mapping of exactly the whole 2 MiB pages, flagged "hg".
+    uintptr_t page = uintptr_t{2} << 20, first = reinterpret_cast<uintptr_t>(block.get());
+    std::ostringstream pages;
+    pages << std::hex << '\n' << ((first + page - 1) & -page) << '-' << ((first + zv::kHugeOutput) & -page);
+    std::string smaps = zvt::get_file("/proc/self/smaps");
+    // The 32-bit build runs emulated here, where advice is neither passed on nor shown.
+    if (sizeof(void *) < 8 || !std::ifstream("/sys/kernel/mm/transparent_hugepage/enabled"))
+        GTEST_SKIP() << "no huge pages, or an emulated 32-bit run";
+    std::string flags = smaps.substr(smaps.find("VmFlags", smaps.find(pages.str() + ' ')));
+    EXPECT_LT(flags.find(" hg"), flags.find('\n'));
+}
+
+TEST(Strings, SplitJoinAppend)
+{
+    auto split = [](const char *text, const char *separator) {
+        char **fields = nullptr;
+        uint32_t count = 99;
+        EXPECT_EQ(zv_util_split(text, separator, &fields, &count), ZV_OK);
+        std::string all = count == 0 && fields == nullptr ? "" : "|";
+        for (uint32_t i = 0; i < count; all += std::string(fields[i]) + "|", std::free(fields[i++]))
+            EXPECT_TRUE(holds(fields[i], std::strlen(fields[i]) + 1));
+        std::free(fields);
+        return all;
+    };
+    EXPECT_EQ(split("one--two", "-") + split("one--two", "--"), "|one|two||one|two|") << "runs collapse";
+    EXPECT_EQ(split(",a,,b,", ","), "|a|b|");
+    EXPECT_EQ(split("a-b", "--"), "|a-b|") << "only the whole separator matches";
+    EXPECT_EQ(split("xaaa", "aa"), "|x|a|") << "a last piece shorter than it";
+    EXPECT_EQ(split(",,,", ",") + split("", ","), "") << "no field: no array";
+    for (std::string field = "x"; field.size() < 30; field += 'x')  // through every block size
+        EXPECT_EQ(split((field + ",").c_str(), ","), "|" + field + "|");
+    auto join = [](std::vector<const char *> strings, const char *separator, uint32_t count) {
+        char *out = nullptr;
+        uint32_t size = 0;
+        EXPECT_EQ(zv_util_join(strings.data(), count, separator, &out, &size), ZV_OK);
+        std::string joined(out);
+        EXPECT_TRUE(size == joined.size() + 1 && holds(out, size));
+        std::free(out);
+        return joined;
+    };
+    EXPECT_EQ(join({"a"}, "--", 1) + join({nullptr}, ",", 0), "a") << "count 0 reads no string";
+    EXPECT_EQ(join({"alpha", "bravo", "charlie", "delta"}, ", ", 4), "alpha, bravo, charlie, delta");
+    EXPECT_EQ(join({"a", "", "bcdef"}, "", 3), "abcdef");
+
+    std::string expected;
+    expected.reserve(128);
+    size_t heap = zvt::heap_in_use();
+    char *string = nullptr;
+    uint32_t length = 42;  // ignored while the string is NULL
+    for (uint32_t n = 1; expected.size() < 100; n = n % 3 + 1) {  // through every block size
+        expected.append("a\0b", n);  // a NUL within n is copied like any byte
+        ASSERT_EQ(zv_util_append_string(&string, &length, "a\0b", n), ZV_OK);
+        ASSERT_TRUE(length == expected.size() && std::memcmp(string, expected.c_str(), length + 1) == 0) << length;
+        EXPECT_TRUE(holds(string, length + 1)) << length;
+    }
+    std::free(string);
+    EXPECT_EQ(zvt::heap_in_use(), heap);
+}
+
+// A failure row's call, which stores its result through &o (of |Type|) and
+// must leave it NULL.
+#define ZVT_NULLS(Type, ...) \
+    [&] { Type o = reinterpret_cast<Type>(8); zv_status s = __VA_ARGS__; EXPECT_EQ(o, nullptr); return s; }
+
+zv_status vsize(uint32_t *size, const char *format, ...)
+{
+    va_list args;
+    va_start(args, format);
+    zv_status status = zv_util_printf_vsize(format, args, size);
+    va_end(args);
+    return status;
+}
+
+TEST(Strings, FailureTable)
+{
+    // Refused calls write nothing to these; |out| also stands for a string
+    // the calls never read.
+    char *out = reinterpret_cast<char *>(8), **fields = reinterpret_cast<char **>(8);
+    wchar_t *wide = reinterpret_cast<wchar_t *>(8);
+    uint32_t n = 7, lengths[] = {0, UINT32_MAX - 2, UINT32_MAX - 3}, size, count;
+    const char *strings[] = {"a", "b"}, *no_format = nullptr, *log = "Allocation failed";
+    std::string sep(65538, '-');
+    std::vector<const char *> empties(65535, "");  // 65535 separators of 65537 make 2^32 - 1
+    auto split = ZVT_NULLS(char **, zv_util_split("one,two,three", ",", &o, &count));
+    auto format = ZVT_NULLS(char *, zv_util_asprintf(&o, &zvt::row_errno, "%s/%d", "path", 12));
+    auto convert = ZVT_NULLS(wchar_t *, zv_util_char_to_wchar("abc", 0, &o, &count));
+    const char *join = "zv_util_join", *add = "zv_util_append_string", *vas = "zv_util_vasprintf",
+               *wchar = "zv_util_char_to_wchar", *scan = "zv_util_sscanf_bytes", *print = "zv_util_sprintf_bytes";
+    zvt::expect_failures({
+        // Text beyond 32 bits is refused; the longest that fits is allocated.
+        {"", kMem, ZVT_CALL(zv_util_base64_encode("", 3221225470u, &out, &n))},
+        {"", kMem, ZVT_NULLS(char *, zv_util_base64_encode("", 3221225469u, &o, &n)), "alloc"},
+        {"", kMem, ZVT_NULLS(uint8_t *, zv_util_base64_decode("Zg", 2, &o, &n)), "alloc"},
+        {scan, kBad, ZVT_NULLS(uint8_t *, zv_util_sscanf_bytes("g0", 2, &o))},
+        {scan, kBad, ZVT_NULLS(uint8_t *, zv_util_sscanf_bytes("0:", 2, &o))},
+        {scan, kMem, ZVT_NULLS(uint8_t *, zv_util_sscanf_bytes("01", 2, &o)), "alloc", 1, kUntouched, log},
+        {print, kMem, ZVT_NULLS(char *, zv_util_sprintf_bytes("", 1, &o)), "alloc", 1, kUntouched, log},
+        // From 2^31 bytes on the text would not fit 32 bits.
+        {print, kMem, ZVT_NULLS(char *, zv_util_sprintf_bytes("", 1u << 31, &o)), nullptr, 1, kUntouched, log},
+        {"zv_util_fprintf_bytes", kNull, ZVT_CALL(zv_util_fprintf_bytes(nullptr, "", 0))},
+        {"zv_util_fprintf_bytes", kNull, ZVT_CALL(zv_util_fprintf_bytes(stdout, nullptr, 0))},
+        {"zv_util_printf_bytes", kNull, ZVT_CALL(zv_util_printf_bytes(nullptr, 1))},
+        {"zv_util_split", kBad, ZVT_CALL(zv_util_split("a", "", &fields, &n))},
+        // The array comes first, then one block per field.
+        {"zv_util_split", kMem, split, "alloc", 1, kUntouched, "Memory allocation failed"},
+        {"zv_util_split", kMem, split, "alloc", 3, kUntouched, "Failed to allocate memory"},
+        {join, kNull, ZVT_CALL(zv_util_join(nullptr, 1, ",", &out, &size))},
+        {join, kNull, ZVT_CALL(zv_util_join(strings, 1, nullptr, &out, &size))},
+        {join, kNull, ZVT_CALL(zv_util_join(strings, 1, ",", nullptr, &size))},
+        {join, kNull, ZVT_CALL(zv_util_join(strings, 1, ",", &out, nullptr))},
+        {join, kOver, ZVT_CALL(zv_util_join(empties.data(), 65535, sep.c_str(), &out, &size))},
+        // The size just fits, or fits with a separator to spare; allocating it fails.
+        {join, kMem, ZVT_NULLS(char *, zv_util_join(empties.data(), 65535, sep.c_str() + 1, &o, &size)), "alloc"},
+        {join, kMem, ZVT_NULLS(char *, zv_util_join(empties.data(), 65534, sep.c_str() + 1, &o, &size)), "alloc"},
+        {add, kNull, ZVT_CALL(zv_util_append_string(nullptr, &n, "xy", 1))},
+        {add, kNull, ZVT_CALL(zv_util_append_string(&out, nullptr, "xy", 1))},
+        {add, kNull, ZVT_CALL(zv_util_append_string(&out, &n, nullptr, 1))},
+        {add, kBad, ZVT_CALL(zv_util_append_string(&out, &n, "xy", 0))},
+        {add, kBad, ZVT_CALL(zv_util_append_string(&out, &lengths[0], "xy", 1))},
+        // The new length and its NUL: one past 32 bits, then just fitting.
+        {add, kOver, ZVT_CALL(zv_util_append_string(&out, &lengths[1], "xy", 2))},
+        {add, kMem, ZVT_CALL(zv_util_append_string(&out, &lengths[2], "xy", 2)), "alloc"},
+        {vas, kNull, ZVT_CALL(zv_util_asprintf(nullptr, &zvt::row_errno, "x"))},
+        {vas, kNull, ZVT_CALL(zv_util_asprintf(&out, &zvt::row_errno, no_format))},
+        {"zv_util_printf_vsize", kNull, ZVT_CALL(vsize(nullptr, "x"))},
+        {"zv_util_printf_vsize", kNull, ZVT_CALL(vsize(&n, no_format))},
+        {"zv_util_printf_vsize,zv_util_vasprintf", ZV_ERR_SYSTEM, format, "vsnprintf"},
+        {vas, ZV_ERR_SYSTEM, format, "vsnprintf", 2, EIO},
+        {vas, kMem, format, "alloc"},
+        {wchar, kNull, ZVT_CALL(zv_util_char_to_wchar(nullptr, 0, &wide, &count))},
+        {wchar, kNull, ZVT_CALL(zv_util_char_to_wchar("a", 0, nullptr, &count))},
+        {wchar, kNull, ZVT_CALL(zv_util_char_to_wchar("a", 0, &wide, nullptr))},
+        {wchar, kBad, ZVT_CALL(zv_util_char_to_wchar("a\x80", 0, &wide, &count))},  // before allocating
+        // Allocating fails; converting fails, or stops short of the end.
+        {wchar, kMem, convert, "alloc"},
+        {wchar, kBad, convert, "mbsrtowcs", 2},
+        {wchar, ZV_ERR_TOO_SMALL, convert, "mbsrtowcs_short"},
+    });
+    // 65535 strings of 65537 characters and no separator: 2^32 - 1 characters and
+    // no room for the NUL. Reading 4 GiB is too slow under emulation.
+    std::vector<const char *> pieces(65535, sep.c_str() + 1);
+    if (sizeof(void *) == 8)
+        zvt::expect_failures({{join, kOver, ZVT_CALL(zv_util_join(pieces.data(), 65535, "", &out, &size))}});
+    EXPECT_TRUE(out == (void *)fields && out == (void *)wide && n == 7 && lengths[2] == UINT32_MAX - 3);
+    for (int k = 0; k < 4; k++) {
+        const void *a[] = {"a,b", ",", &fields, &n};
+        a[k] = nullptr;
+        char message[128];
+        std::snprintf(message, sizeof message, "NULL argument detected: %p %p %p %p", a[0], a[1], a[2], a[3]);
+        auto call =
+            ZVT_CALL(zv_util_split((const char *)a[0], (const char *)a[1], (char ***)a[2], (uint32_t *)a[3]));
+        zvt::expect_failures({{"zv_util_split", kNull, call, nullptr, 1, kUntouched, message}});
+    }
+}
+
+TEST(Memory, Primitives)
+{
+    size_t heap = zvt::heap_in_use();
+    char *block = static_cast<char *>(std::malloc(16));
+    zv_util_free(&block);
+    zv_util_free(nullptr);
+    EXPECT_TRUE(block == nullptr && zvt::heap_in_use() == heap);
+    std::string source;
+    // Through every block size.
+    for (uint32_t size = 0; size < 48; source += static_cast<char>('A' + size++)) {
+        auto *copy = static_cast<char *>(zv_util_memdup(source.data(), size));
+        auto *text = static_cast<char *>(zv_util_memdup0(source.data(), size));
+        EXPECT_TRUE(std::string(copy, size) == source && std::string(text, size + 1) == source + '\0' &&
+                    holds(copy, size) && holds(text, size + 1)) << size;
+        std::free(copy);
+        std::free(text);
+    }
+    zvt::fault_arm("alloc", 1, ENOMEM, ~0u);
+    void *failed[] = {zv_util_memdup0("x", UINT32_MAX), zv_util_memdup(nullptr, 3), zv_util_memdup0(nullptr, 3),
+                      zv_util_memdup("abc", 3), zv_util_memdup0("abc", 3), zv_util_strndup("abc", 2)};
+    EXPECT_EQ(zvt::fault_calls("alloc"), 3u) << "the first three allocate nothing";
+    zvt::fault_clear();
+    EXPECT_EQ(std::count(failed, failed + 6, nullptr), 6);
+
+    const std::tuple<int32_t, const char *, int32_t, const char *> rows[] = {
+        {8, "1234567", 7, "1234567"}, {8, "12345678", -1, "1234567"}, {0, "a", -1, "-"}, {-1, "a", -1, "-"}};
+    for (const auto &[size, text, result, after] : rows) {
+        char buffer[16] = "-";
+        EXPECT_TRUE(zv_util_snprintf(buffer, size, "%s", text) == result && std::string(buffer) == after) << size;
+    }
+    // The walk stops at the maximum or at the first NUL of the original text.
+    const std::tuple<uint32_t, char, const char *> replaced[] = {
+        {3, '.', "a\0n.n."}, {100, '.', "a\0n\0n\0"}, {0, '.', "a.n.n."}, {100, '\0', "a.n.n."}};
+    for (const auto &[maximum, find, after] : replaced) {
+        char text[] = "a.n.n.\0z";
+        EXPECT_EQ(zv_util_str_replace(text, maximum, find, find ? '\0' : 'b'), ZV_OK);
+        EXPECT_EQ(std::memcmp(text, after, 7), 0) << maximum;
+    }
+    EXPECT_EQ(zv_util_str_replace(nullptr, 5, 'a', 'b'), ZV_OK);
+}
+
+TEST(Strings, AsprintfAllocatesExactlyTheMeasuredSizeAndWideTextUsesTheLocale)
+{
+    std::string big(5000, 'q'), expected = "x=42 " + big + "%";
+    char *text = nullptr;
+    int32_t err = -1;
+    uint32_t size = 0;
+    EXPECT_TRUE(vsize(&size, "") == ZV_OK && size == 1) << "an empty text";
+    ASSERT_EQ(zv_util_asprintf(&text, &err, "x=%d %s%%", 42, big.c_str()), ZV_OK);
+    EXPECT_EQ(vsize(&size, "x=%d %s%%", 42, big.c_str()), ZV_OK);
+    EXPECT_TRUE(text == expected && err == 0 && size == expected.size() + 1 && holds(text, size));
+    std::free(text);
+
+    std::string saved = std::setlocale(LC_CTYPE, nullptr), multibyte;
+    ASSERT_NE(std::setlocale(LC_CTYPE, "C.UTF-8"), nullptr);
+    const char *pieces[] = {"a", "\xc3\xa9", "\xe2\x82\xac", "\xf0\x9f\x98\x80"};
+    const wchar_t wides[] = L"a\u00e9\u20ac\U0001F600";
+    std::wstring wide;
+    // Through every block size.
+    for (uint32_t i = 0, count; i < 16; multibyte += pieces[i % 4], wide += wides[i++ % 4]) {
+        wchar_t *out = nullptr;
+        ASSERT_EQ(zv_util_char_to_wchar(multibyte.c_str(), 12345, &out, &count), ZV_OK);
+        EXPECT_TRUE(std::wstring(out, count + 1) == wide + L'\0' && holds(out, (count + 1) * sizeof(wchar_t)));
+        std::free(out);
+    }
+    std::setlocale(LC_CTYPE, saved.c_str());
+}
+
+}  // namespace
