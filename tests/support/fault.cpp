@@ -222,7 +222,6 @@ WRAP(vsnprintf, int, (char *a, size_t b, const char *c, va_list d), "vsnprintf",
 // as a locale changed between measuring and converting would.
 WRAP(mbsrtowcs, size_t, (wchar_t *a, const char **b, size_t c, mbstate_t *d), "mbsrtowcs",
      size_t(-1), __real_mbsrtowcs(a, b, c - (a != nullptr && c > 0 && HIT("mbsrtowcs_short")), d))
-WRAP(fork, pid_t, (void), "fork", -1, __real_fork())
 WRAP(waitpid, pid_t, (pid_t a, int *b, int c), "waitpid", -1, __real_waitpid(a, b, c))
 WRAP(sigaction, int, (int a, const struct sigaction *b, struct sigaction *c), "sigaction", -1,
      __real_sigaction(a, b, c))
