@@ -33,7 +33,7 @@ struct Rule {
 } rules[8];
 unsigned rule_count, open_count;
 bool fired;
-OpenCall opens[64];
+OpenCall opens[512];  // room for a scan of every /proc entry
 std::optional<timespec> pinned;
 
 bool known(const char *point)
