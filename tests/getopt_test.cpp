@@ -67,6 +67,7 @@ TEST(Getopt, FormsHandlersAndFailures)
          1, zvt::kUntouched, "Missing mandatory option"},
         ROW(null, getopt, 1, nullptr, table, 1), ROW(bad, getopt, 0, argv, table, 1),
         ROW(null, getopt_from, 1, argv, nullptr, 1, 0), ROW(bad, getopt_from, 1, argv, table, 0, 0),
+        ROW(bad, getopt_from, 0, argv, table, 1, 0),
         {"", ZV_OK, ZVT_CALL(zv_util_getopt(1, argv, table, 1))},
         {"", ZV_OK, ZVT_CALL(zv_util_getopt_from(1, argv, table, 1, 0))},
         // Handlers on their own refuse each NULL inside their checks.

@@ -79,7 +79,6 @@ unsigned fault_calls(const char *point)
     return 0;
 }
 
-// For the wrappers: true when this call must fail; errno is then already set.
 bool fault_hit(const char *point)
 {
     for (Rule *r = rules; r != rules + rule_count; r++)
@@ -161,13 +160,7 @@ struct Reset : ::testing::EmptyTestEventListener {
 
 }  // namespace zvt
 
-// HIT(point) answers whether this call must fail, and puts |point| among the
-// names fault_arm accepts.
-#define HIT(point)                                                                        \
-    [] {                                                                                  \
-        [[gnu::used, gnu::section("zvt_points")]] static const char *const name = point; \
-        return zvt::fault_hit(name);                                                      \
-    }()
+#define HIT ZVT_HIT
 
 // __wrap_FN returns |fail| when |point| fires, and the value of |...| otherwise
 // (which calls __real_FN, FN itself).

@@ -1,5 +1,5 @@
 // Fault injection: the test executable links the library's archive with
-// -Wl,--wrap=NAME for every function support/fault.cpp wraps, so calls to it
+// -Wl,--wrap=NAME for every function support/*.cpp wraps, so calls to it
 // (the test's own included) pass through a wrapper that fails with the armed
 // errno when its point fires. Points are named after the function ("alloc"
 // for every allocation); a name no wrapper serves fails the test. Arming
@@ -35,6 +35,16 @@ auto with_fault(const char *point, unsigned nth, int err, F &&call)
     fault_clear();
     return result;
 }
+
+// For wrappers: true when this call must fail; errno is then already set.
+// Wrappers name their points through ZVT_HIT, which also places the name in
+// a linker section, so fault_arm accepts exactly the names some wrapper serves.
+bool fault_hit(const char *point);
+#define ZVT_HIT(point)                                                                    \
+    [] {                                                                                  \
+        [[gnu::used, gnu::section("zvt_points")]] static const char *const name = point; \
+        return ::zvt::fault_hit(name);                                                    \
+    }()
 
 // Every open and fopen call (the two the library's archive makes), recorded by
 // its wrapper without heap use: |flags| are the open flags (-1 for fopen),
