@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <cstring>
+#include <string>
 #include <thread>
 
 #include <zverrortrace.h>
@@ -62,4 +64,25 @@ TEST(Threads, FirstCallersOfTheProcessorCheckAgree)
     uint32_t seen[4];
     run_threads([&](int t) { seen[t] = zv::cpu::features(); });
     EXPECT_TRUE(seen[0] == seen[1] && seen[1] == seen[2] && seen[2] == seen[3]);
+}
+
+// The child of a spawn touches neither the heap nor the allocator's state that
+// another thread keeps using meanwhile.
+TEST(Threads, SpawnBesideAThreadThatAllocatesAndLogs)
+{
+    zv_log_set_sink([](void *, int32_t, uint32_t, const char *, const char *, int32_t,
+                       const char *text) { delete[] new char[std::strlen(text) + 1]; }, nullptr);
+    std::atomic<bool> stop{false};
+    std::thread busy([&] {
+        for (int i = 0; !stop; i++)
+            zv_util_log_internal(3, 128, "busy", "f", i, "%s", std::string(i % 999, 'x').c_str());
+    });
+    char path[] = "/bin/true", *argv[] = {path, nullptr};
+    int32_t code = 0, failed = 0;
+    for (int i = 0; i < 50; i++)
+        failed += zv_spawn_and_wait(argv, argv + 1, &code) != ZV_OK || code != 0;
+    stop = true;
+    busy.join();
+    zv_log_set_sink(nullptr, nullptr);
+    EXPECT_EQ(failed, 0);
 }
