@@ -7,7 +7,6 @@
 #include <cstring>
 #include <random>
 
-#include "output_block.h"
 #include "support/feature_paths.h"
 #include "support/scratch.h"
 #include <zvutil/base64.h>
@@ -119,21 +118,6 @@ TEST(Coders, Base64AndHexKnownAnswersAndEveryPathAsScalar)
     EXPECT_EQ(zv_util_fprintf_bytes(stream, text.data(), text.size()), ZV_OK);  // in several chunks
     std::fclose(stream);
     EXPECT_EQ(printed + std::string(1, '\0'), hex(text));
-}
-
-TEST(Coders, WholeHugePagesOfLargeOutputBlocksAreAdvised)
-{
-    std::unique_ptr<void, decltype(&std::free)> block(zv::malloc_output(zv::kHugeOutput), std::free);
-    // The advice splits off a mapping of exactly the whole 2 MiB pages, flagged "hg".
-    uintptr_t page = uintptr_t{2} << 20, first = reinterpret_cast<uintptr_t>(block.get());
-    std::ostringstream pages;
-    pages << std::hex << '\n' << ((first + page - 1) & -page) << '-' << ((first + zv::kHugeOutput) & -page);
-    std::string smaps = zvt::get_file("/proc/self/smaps");
-    // The 32-bit build runs emulated here, where advice is neither passed on nor shown.
-    if (sizeof(void *) < 8 || !std::ifstream("/sys/kernel/mm/transparent_hugepage/enabled"))
-        GTEST_SKIP() << "no huge pages, or an emulated 32-bit run";
-    std::string flags = smaps.substr(smaps.find("VmFlags", smaps.find(pages.str() + ' ')));
-    EXPECT_LT(flags.find(" hg"), flags.find('\n'));
 }
 
 TEST(Strings, SplitJoinAppend)
