@@ -26,8 +26,7 @@ const std::string kSelf = std::to_string(getpid());
 pid_t zombie()
 {
     pid_t pid = fork();
-    if (pid == 0)
-        _exit(0);
+    if (pid == 0) _exit(0);
     siginfo_t info = {};
     waitid(P_PID, pid, &info, WEXITED | WNOWAIT);
     return pid;
@@ -92,29 +91,38 @@ TEST(PidFile, Claims)
     waitpid(ended, nullptr, 0);
 }
 
-TEST(Spawn, ExitCodesArgumentsEnvironmentAndNoProcessLeft)
+TEST(Spawn, ExitCodesArgumentsEnvironmentSignalStateAndNoProcessLeft)
 {
-    FILE *buffered = std::tmpfile();
-    std::fputs("once", buffered);  // a child must not write it a second time
-    std::pair<std::vector<const char *>, int32_t> rows[] = {
-        {{"/nonexistent/program", nullptr}, 1},  // the exec fails
-        {{"/bin/true", nullptr}, 0},
-        {{"/bin/sh", "-c", "exit 255", nullptr}, 255},
-        {{"/bin/sh", "-c", "kill -9 $$", nullptr}, -1},
-        {{"/bin/sh", "-c", "test \"$A\" = 1 && test -z \"${HOME+set}\"", nullptr}, 0},
-    };
-    size_t heap = zvt::heap_in_use();
     zv_proc_handle *handle = nullptr;
-    for (auto &[args, expected] : rows) {
-        int32_t code = 12345, joined = 12345;
-        Argv argv = const_cast<Argv>(args.data());
-        EXPECT_TRUE(zv_spawn(argv, env, &handle) == ZV_OK && zv_wait(&handle, &code) == ZV_OK);
-        EXPECT_TRUE(handle == nullptr && zv_spawn_and_wait(argv, env, &joined) == ZV_OK);
-        EXPECT_EQ(std::make_pair(code, joined), std::make_pair(expected, expected)) << args.end()[-2];
-    }
-    EXPECT_EQ(zvt::heap_in_use(), heap);
-    EXPECT_EQ(std::fseek(buffered, 0, SEEK_END) == 0 ? std::ftell(buffered) : -1L, 4L);
-    std::fclose(buffered);
+    zvt::in_child(false, [&] {  // with SIGUSR1 blocked, SIGUSR2 ignored and SIGTERM caught
+        sigset_t usr1 = {};
+        sigaddset(&usr1, SIGUSR1);
+        sigprocmask(SIG_SETMASK, &usr1, nullptr);
+        signal(SIGUSR2, SIG_IGN), signal(SIGTERM, [](int) {});
+        FILE *buffered = std::tmpfile();
+        std::fputs("once", buffered);  // a child must not write it a second time
+        std::pair<std::vector<const char *>, int32_t> rows[] = {
+            {{"/nonexistent/program", nullptr}, 1},  // the exec fails
+            {{"/bin/sh", "-c", "exit 255", nullptr}, 255},
+            {{"/bin/sh", "-c", "kill -s TERM $$; exit 3", nullptr}, -1},  // at its default
+            {{"/bin/sh", "-c", "test \"$A\" = 1 && test -z \"${HOME+set}\"", nullptr}, 0},
+            // Blocked stays blocked, ignored stays ignored.
+            {{"/bin/grep", "-q", "^SigBlk:\t0*200$", "/proc/self/status", nullptr}, 0},
+            {{"/bin/grep", "-qE", "^SigIgn:\t.*[89a-f]..$", "/proc/self/status", nullptr}, 0},
+        };
+        size_t heap = zvt::heap_in_use();
+        for (auto &[args, expected] : rows) {
+            int32_t code = 12345, joined = 12345;
+            errno = EDOM;  // a child's failed exec must not set the caller's
+            Argv argv = const_cast<Argv>(args.data());
+            EXPECT_TRUE(zv_spawn(argv, env, &handle) == ZV_OK && zv_wait(&handle, &code) == ZV_OK);
+            EXPECT_TRUE(handle == nullptr && zv_spawn_and_wait(argv, env, &joined) == ZV_OK);
+            EXPECT_EQ(std::tie(code, joined, errno), std::make_tuple(expected, expected, EDOM))
+                << args.end()[-2];
+        }
+        EXPECT_EQ(zvt::heap_in_use(), heap);
+        EXPECT_EQ(std::fseek(buffered, 0, SEEK_END) == 0 ? std::ftell(buffered) : -1L, 4L);
+    });
     zvt::in_child(true, [&] {  // a process that may start no other
         struct rlimit zero = {0, 0};
         ASSERT_EQ(setrlimit(RLIMIT_NPROC, &zero), 0);
@@ -134,10 +142,9 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
         signal(SIGTERM, note_signal);
         for (int sig : {SIGKILL, SIGTERM, SIGSTOP, 0, 32, 40, -1})  // left alone
             EXPECT_EQ(zv_util_ignore_signal(sig), ZV_OK) << sig;
-        for (int sig : {1, 31}) {
-            EXPECT_TRUE(zv_util_ignore_signal(sig) == ZV_OK && disposition(sig) == SIG_IGN) << sig;
-            EXPECT_TRUE(zv_util_reset_signal(sig) == ZV_OK && disposition(sig) == SIG_DFL) << sig;
-        }
+        for (int sig : {1, 31})
+            EXPECT_TRUE(zv_util_ignore_signal(sig) == ZV_OK && disposition(sig) == SIG_IGN &&
+                        zv_util_reset_signal(sig) == ZV_OK && disposition(sig) == SIG_DFL) << sig;
         EXPECT_STATUS(ZV_ERR_SYSTEM, zv_util_reset_signal(SIGKILL));  // refused by the kernel
         // SIGHUP's failure does not stop the walk.
         EXPECT_EQ(zvt::with_fault("sigaction", 1, EINVAL, zv_util_ignore_common_signals), ZV_ERR_SYSTEM);
@@ -152,7 +159,6 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
         zvt::expect_failures({
             {"zv_util_reset_signal", ZV_ERR_BAD_VALUE, ZVT_CALL(zv_util_reset_signal(0)), nullptr, 1,
              kUntouched, "Invalid or unsupported signal value"},
-            {"zv_spawn", ZV_ERR_NO_MEMORY, ZVT_CALL(zv_spawn(run_true, env, &none)), "alloc"},
             {"zv_spawn,zv_spawn_and_wait", ZV_ERR_NO_MEMORY,
              ZVT_CALL(zv_spawn_and_wait(run_true, env, &code)), "alloc"},
             {"zv_wait", ZV_ERR_NULL_ARG, ZVT_CALL(zv_wait(&none, &code))},
@@ -216,7 +222,6 @@ TEST(PidOf, MatchModesOrderFilterAndFailures)
         std::strcpy(entry.d_name, name.c_str());
         EXPECT_EQ(vet_possible_directory(&entry), keep) << name;
     }
-    EXPECT_EQ(vet_possible_directory(nullptr), 0);
     zvt::expect_failures({
         {"zv_util_pid_of", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_pid_of("", 0, nullptr, &count)), "scandir", 1,
          kUntouched, "Failed to open /proc"},
@@ -231,8 +236,7 @@ TEST(AwaitChild, EndsOrIsKilledAtTheDeadline)
 {
     EXPECT_EQ(zv_util_await_child_timeout(zombie(), 5), ZV_OK);
     pid_t late = fork();
-    if (late == 0)
-        _exit(usleep(100000));
+    if (late == 0) _exit(usleep(100000));
     EXPECT_EQ(zv_util_await_child_timeout(late, 30), ZV_OK) << "ended while waited for";
     // At the deadline the child is killed; a clock that cannot be read counts as past it.
     for (int32_t timeout : {0, 30}) {
