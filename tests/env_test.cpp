@@ -7,11 +7,9 @@
 
 namespace {
 
-std::string take(char *text)
+std::string take(char *text)  // a copy of |text|, which is freed; "<NULL>" for none
 {
-    std::string copy = text != nullptr ? text : "<NULL>";
-    std::free(text);
-    return copy;
+    return std::unique_ptr<char, decltype(&std::free)>(text, std::free) ? text : "<NULL>";
 }
 
 TEST(Environment, VariablesAndHostName)

@@ -1,15 +1,19 @@
-// Descriptors, named files, durable sync, path components and directories.
+// Descriptors, named files, durable sync, close-on-exec, path components and directories.
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cstring>
 #include <fcntl.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 
+#include "process/process_internal.h"
 #include "support/feature_paths.h"
 #include "support/scratch.h"
+#include "system/system_internal.h"
 #include <zvutil/directory.h>
 #include <zvutil/file.h>
+#include <zvutil/process.h>
 
 namespace {
 
@@ -78,7 +82,7 @@ TEST(Files, FailureTable)
           zv_util_write_named_file(kAbsent, 1, nullptr, 0, 0), zv_util_copy_file(kAbsent, nullptr)})
         EXPECT_STATUS(ZV_ERR_NULL_ARG, status);
     zvt::ScratchDir dir;
-    std::string f = dir / "f", big = dir / "big";
+    std::string f = dir / "f", big = dir / "big", f_x = f + "/x";
     put_file(f, std::string(2000, '\n'));
     int fd = open_read(f), huge = open(big.c_str(), O_RDWR | O_CREAT | O_LARGEFILE, 0600), out = 0;
     ASSERT_EQ(ftruncate64(huge, (off64_t{1} << 32) + 1), 0);  // sparse, beyond 32 bits
@@ -86,6 +90,7 @@ TEST(Files, FailureTable)
     lseek(fd, 7, SEEK_SET);  // where a failed line count must leave it
     auto write = ZVT_CALL(zv_util_write_named_file(f.c_str(), 1, "data", 4, nullptr));
     auto read_fd = [&](int from) { return zv_util_read_file(from, &buf, &n, kErr); };
+    auto read_path = [&](auto &p) { return zv_util_read_named_file(p.c_str(), &buf, &n, nullptr); };
     // Where offsets are 32 bits every size query refuses 2 GiB or more; with
     // 64-bit offsets the descriptor read refuses 2 GiB, the named one 4 GiB.
     bool narrow = sizeof(off_t) == 4;
@@ -102,13 +107,12 @@ TEST(Files, FailureTable)
         {"zv_util_truncate_file", kSys, ZVT_CALL(zv_util_truncate_file(kAbsent, 0, kErr)), 0, 1,
          ENOENT},
         {"zv_util_delete_file", kSys, ZVT_CALL(zv_util_delete_file(kAbsent, kErr)), 0, 1, ENOENT},
-        {"zv_util_query_file_exists", kSys,  // a file used as a directory: ENOTDIR
-         ZVT_CALL(zv_util_query_file_exists((f + "/x").c_str(), &n))},
+        // A file used as a directory: ENOTDIR.
+        {"zv_util_query_file_exists", kSys, ZVT_CALL(zv_util_query_file_exists(f_x.c_str(), &n))},
         {narrow ? "zv_util_get_file_size,zv_util_read_named_file" : "zv_util_read_named_file",
-         narrow ? kSys : static_cast<zv_status>(ZV_ERR_OVERFLOW),
-         ZVT_CALL(zv_util_read_named_file(big.c_str(), &buf, &n, nullptr))},
-        {"zv_util_read_named_file", kSys,  // the file ends before its measured size
-         ZVT_CALL(zv_util_read_named_file(f.c_str(), &buf, &n, nullptr)), "fstat_grown"},
+         narrow ? kSys : static_cast<zv_status>(ZV_ERR_OVERFLOW), ZVT_CALL(read_path(big))},
+        // The file ends before its measured size.
+        {"zv_util_read_named_file", kSys, ZVT_CALL(read_path(f)), "fstat_grown"},
         {"zv_util_write_named_file", kSys, write, "ferror"},
         {"zv_util_sync,zv_util_write_named_file", kSys, write, "fsync"},
         {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, kAbsent))},
@@ -121,7 +125,7 @@ TEST(Files, FailureTable)
     EXPECT_EQ(close(fd) + close(huge) + std::fclose(stream), 0);
 }
 
-TEST(NamedFiles, WriteAppendReadCopySync)
+TEST(NamedFiles, WriteAppendReadCopySyncAndCloseOnExec)
 {
     zvt::ScratchDir dir;
     std::string f = dir / "f", g = dir / "g";
@@ -141,9 +145,7 @@ TEST(NamedFiles, WriteAppendReadCopySync)
         content += '\0';
         EXPECT_EQ(std::string(named, named_size + 1) + std::string(whole, whole_size + 1),
                   content + content);
-        std::free(named);
-        std::free(whole);
-        close(fd);
+        std::free(named), std::free(whole), close(fd);
     }
     FILE *stream = nullptr;
     ASSERT_EQ(zv_util_fopen(&stream, nullptr, "a", "%s/%c", dir.path().c_str(), 'g'), ZV_OK);
@@ -152,26 +154,38 @@ TEST(NamedFiles, WriteAppendReadCopySync)
     EXPECT_EQ(zv_util_sync(stream, nullptr) + zv_util_sync(stream, dir.path().c_str()) +
                   zv_util_sync_file(longest.c_str()) + std::fclose(stream), ZV_OK);
     EXPECT_EQ(get_file(g), std::string(70000, 'q') + "!");
-    uint32_t exists = 0, gone = 1;
+    uint32_t exists = 0, gone = 1, owner = 0, count = 0, *pids = nullptr;
     int64_t size = 0;
+    zv_proc_stat proc;
     EXPECT_EQ(zv_util_truncate_file(g.c_str(), 1, nullptr) +
                   zv_util_get_file_size(g.c_str(), &size) +
                   zv_util_query_file_exists(g.c_str(), &exists) +
                   zv_util_delete_file(g.c_str(), nullptr) +
-                  zv_util_query_file_exists(g.c_str(), &gone), ZV_OK);
+                  zv_util_query_file_exists(g.c_str(), &gone) +
+                  zv_util_claim_pid_file(g.c_str(), "app", &owner) +  // created, then taken over
+                  zv_util_claim_pid_file(g.c_str(), "app", &owner) +
+                  zv_util_pid_of("no-such-program", 0, &pids, &count) +
+                  zv_util_proc_stat(&proc, getpid()), ZV_OK);
     EXPECT_EQ(size * 100 + exists * 10 + gone, 110);
+    std::free(pids);
+    // What the library opens for itself is close-on-exec, so a child another thread
+    // starts inherits none of it; the caller's own flags and modes pass unchanged.
+    std::string inheritable;
+    for (const zvt::OpenCall &call : zvt::open_log())
+        if (call.flags == -1 ? !std::strchr(call.mode, 'e') : !(call.flags & O_CLOEXEC))
+            inheritable += (call.flags == -1 ? call.mode : std::to_string(call.flags)) + " ";
+    EXPECT_EQ(inheritable, "0 0 0 a ") << "only the caller's three descriptors and one stream";
 }
 
 TEST(Directories, PathsCreateScanQuery)
 {
+    char *out = nullptr;
     for (auto [path, directory] :
          {std::pair{"a/b/c", "a/b"}, {"a//b", "a/"}, {"/x", ""}, {"x", "x"}, {"", ""}}) {
-        char *out = nullptr;
         EXPECT_EQ(zv_util_get_directory_component(path, &out), ZV_OK);
         EXPECT_STREQ(out, directory) << path;
         std::free(out);
     }
-    char *out = nullptr;
     ASSERT_EQ(zv_util_abs_path("/proc/self/../self/.", &out), ZV_OK);
     EXPECT_EQ(std::string(out), "/proc/" + std::to_string(getpid()));
     std::free(out);
