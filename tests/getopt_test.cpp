@@ -9,8 +9,7 @@ namespace {
 // Values of 300 and 301 characters that would convert.
 const std::string k300 = std::string(297, ' ') + "-42", k301 = " " + k300;
 const std::string kLong = "--" + std::string(31, 'L');
-int32_t verbose, number;
-char *output, shown[400];
+int32_t verbose, number; char *output, shown[400];
 
 // Flag, string and integer options; -f is a flag that wants a value; the last
 // long name comes to fill its array without a terminator, and is followed by
@@ -45,18 +44,17 @@ TEST(Getopt, FormsHandlersAndFailures)
              {{"prog", "--verbose", "/output", "-v", "/n", "2147483647", "-n", "-2147483648x"},
               "1 -2147483648 -v"},  // values taken unchanged
              {{"prog", "--Verbose", "--verb", "-vo", "-", "/", "xv", "-z", "--zzz", kLong.c_str()},
-              "0 -1 -"}}) {
-        EXPECT_EQ(parse(args), ZV_OK);
-        EXPECT_EQ(shown, expected);
-    }
+              "0 -1 -"}})
+        EXPECT_TRUE(parse(args) == ZV_OK && shown == expected) << shown;
 
     const std::string tail = ",process_option,zv_util_getopt_from,zv_util_getopt_from";
     const std::string str = "zv_util_getopt_string" + tail, num = "zv_util_getopt_int" + tail;
     const zv_status bad = ZV_ERR_BAD_VALUE, null = ZV_ERR_NULL_ARG;
     char flag[] = "-v", *argv[] = {flag, nullptr}, *text = nullptr;
     uint32_t used, consumed[3];
-    const zv_util_option to_text{0, "", zv_util_getopt_string, &text, 1},
-        to_int{0, "", zv_util_getopt_int, &number, 1}, set{0, "", zv_util_getopt_flag, &number, 0};
+    // Records for the string, integer and flag handlers on their own.
+    const zv_util_option str_r{0, "", zv_util_getopt_string, &text, 1},
+        int_r{0, "", zv_util_getopt_int, &number, 1}, set{0, "", zv_util_getopt_flag, &number, 0};
     zvt::expect_failures({
         {str.c_str(), bad, ZVT_CALL(parse({"prog", "-o", k301.c_str()}))},
         {str.c_str(), ZV_ERR_NO_MEMORY, ZVT_CALL(parse({"prog", "-o", "a"})), "alloc"},
@@ -68,17 +66,13 @@ TEST(Getopt, FormsHandlersAndFailures)
         ROW(null, getopt, 1, nullptr, table, 1), ROW(bad, getopt, 0, argv, table, 1),
         ROW(null, getopt_from, 1, argv, nullptr, 1, 0), ROW(bad, getopt_from, 1, argv, table, 0, 0),
         ROW(bad, getopt_from, 0, argv, table, 1, 0),
-        {"", ZV_OK, ZVT_CALL(zv_util_getopt(1, argv, table, 1))},
         {"", ZV_OK, ZVT_CALL(zv_util_getopt_from(1, argv, table, 1, 0))},
         // Handlers on their own refuse each NULL inside their checks.
-        ROW(null, getopt_string, &to_text, nullptr, &used),
-        ROW(null, getopt_string, &to_text, "7", nullptr),
-        ROW(null, getopt_int, &to_int, nullptr, &used),
-        ROW(null, getopt_int, &to_int, "7", nullptr),
-        ROW(null, getopt_flag, &set, nullptr, nullptr),
-    });
-    EXPECT_EQ(zv_util_getopt_string(&to_text, "7", consumed) |
-                  zv_util_getopt_int(&to_int, "7", consumed + 1) |
+        ROW(null, getopt_string, &str_r, nullptr, &used), ROW(null, getopt_string, &str_r, "7", 0),
+        ROW(null, getopt_int, &int_r, nullptr, &used), ROW(null, getopt_int, &int_r, "7", nullptr),
+        ROW(null, getopt_flag, &set, nullptr, nullptr)});
+    EXPECT_EQ(zv_util_getopt_string(&str_r, "7", consumed) |
+                  zv_util_getopt_int(&int_r, "7", consumed + 1) |
                   zv_util_getopt_flag(&set, nullptr, consumed + 2), ZV_OK);
     EXPECT_TRUE(consumed[0] == 2 && consumed[1] == 2 && consumed[2] == 1) << "arguments consumed";
     std::free(text);

@@ -10,8 +10,12 @@
 
 namespace {
 
-using Words = std::vector<uint64_t>;
-using State = zv_util_prng_state;
+using Words = std::vector<uint64_t>; using State = zv_util_prng_state;
+
+// A failure row of zv_util_<fn> called with |args|: its one frame with |st|,
+// then any other fields of FailureRow by name.
+#define ROW(st, fn, args, ...) zvt::FailureRow{.frames = "zv_util_" #fn, .status = st, \
+    .call = ZVT_CALL(zv_util_##fn args) __VA_OPT__(, ) __VA_ARGS__}
 
 // Lengths around the short forms, the block, the vector lane and the prefetch
 // stride, on every path, at every alignment, ending where the buffer does.
@@ -40,9 +44,8 @@ TEST(Hash64, KnownValuesOnEveryPathAndFeatures)
             }
     });
     uint64_t hash = 42;
-    zvt::expect_failures({
-        {"zv_util_hash64", ZV_ERR_BAD_VALUE, ZVT_CALL(zv_util_hash64(nullptr, 1, &hash))},
-        {"zv_util_hash64", ZV_ERR_BAD_VALUE, ZVT_CALL(zv_util_hash64("a", 0, &hash))}});
+    zvt::expect_failures({ROW(ZV_ERR_BAD_VALUE, hash64, (nullptr, 1, &hash)),
+                          ROW(ZV_ERR_BAD_VALUE, hash64, ("a", 0, &hash))});
     EXPECT_TRUE(hash == 42 && zv::cpu::features() == all);
 }
 
@@ -54,8 +57,7 @@ TEST(Prng, KnownSequencesFillsAndFailures)
     // The next |count| words of single steps; 70 of them tell two states apart.
     auto words = [](State &state, size_t count = 70) {
         Words out(count);
-        for (uint64_t &word : out)
-            EXPECT_EQ(zv_util_prng(&state, &word), ZV_OK);
+        for (uint64_t &word : out) EXPECT_EQ(zv_util_prng(&state, &word), ZV_OK);
         return out;
     };
     State state = seeded(1, 0), zero = seeded(0, 0), ones = seeded(~0ull, 0), extra = seeded(1, 5);
@@ -63,11 +65,10 @@ TEST(Prng, KnownSequencesFillsAndFailures)
     EXPECT_EQ(words(state, 3), first);
     EXPECT_EQ(words(zero, 2), words(ones, 2)) << "seed 0 acts as all ones";
     EXPECT_EQ(words(extra, 3), (Words{0xD85F17C16A4BD32D, first[1], first[2]}));
-    uint64_t mixed = 0, next = 0;
-    state = seeded(1, 0);
+    uint64_t mixed = 0, next = 0; state = seeded(1, 0);
     EXPECT_TRUE(zv_util_mix_into_prng(&state, 7, &mixed) == ZV_OK &&
-                zv_util_prng_unpacked(&state.position, &state.weyl, state.pool, &next) == ZV_OK);
-    EXPECT_TRUE(mixed == 0xB85497AA02510643u && next == first[1]);
+                zv_util_prng_unpacked(&state.position, &state.weyl, state.pool, &next) == ZV_OK &&
+                mixed == 0xB85497AA02510643u && next == first[1]);
 
     // Fills write the bytes of single steps and leave the same state, on every
     // path: counts around the lane and pool-round thresholds, from positions
@@ -94,13 +95,10 @@ TEST(Prng, KnownSequencesFillsAndFailures)
     // One NULL at a time.
     zvt::expect_failures({
         {"zv_util_prng_unpacked", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_prng(&state, nullptr))},
-        {"zv_util_prng_unpacked", ZV_ERR_NULL_ARG,
-         ZVT_CALL(zv_util_prng_unpacked(&state.position, nullptr, state.pool, &mixed))},
-        {"zv_util_prng_batch", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_prng_batch(&state, nullptr, 1))},
-        {"zv_util_mix_into_prng", ZV_ERR_BAD_VALUE,
-         ZVT_CALL(zv_util_mix_into_prng(&state, 7, nullptr))},
-        {"", ZV_OK, ZVT_CALL(zv_util_prng_fill(nullptr, nullptr, 0))},
-    });
+        ROW(ZV_ERR_NULL_ARG, prng_unpacked, (&state.position, nullptr, state.pool, &mixed)),
+        ROW(ZV_ERR_NULL_ARG, prng_batch, (&state, nullptr, 1)),
+        ROW(ZV_ERR_BAD_VALUE, mix_into_prng, (&state, 7, nullptr)),
+        {"", ZV_OK, ZVT_CALL(zv_util_prng_fill(nullptr, nullptr, 0))}});
 }
 
 TEST(Numeric, SumsPowersOfTwoAndOverflow)
@@ -118,11 +116,8 @@ TEST(Numeric, SumsPowersOfTwoAndOverflow)
     zv_util_sum_free(&w), zv_util_sum_free(&w), zv_util_sum_free(nullptr);  // all accepted
     zvt::expect_failures({
         {"", ZV_OK, [&] { zv_status s = zv_util_sum_init(&w, 3); zv_util_sum_free(&w); return s; }},
-        {"zv_util_sum_init", ZV_ERR_BAD_VALUE, ZVT_CALL(zv_util_sum_init(&w, 0)), nullptr, 1,
-         zvt::kUntouched, "N is zero"},
-        {"zv_util_sum_init", ZV_ERR_NO_MEMORY, ZVT_CALL(zv_util_sum_init(&w, 4)), "alloc", 1,
-         zvt::kUntouched, "calloc() failed, N=4"}});
-    EXPECT_EQ(w.slots, nullptr);
+        ROW(ZV_ERR_BAD_VALUE, sum_init, (&w, 0), .log = "N is zero"),
+        ROW(ZV_ERR_NO_MEMORY, sum_init, (&w, 4), .point = "alloc", .log = "calloc() failed, N=4")});
 
     for (auto [value, up, down] : std::initializer_list<std::tuple<uint32_t, uint32_t, uint32_t>>{
              {0, 0, 0}, {1, 1, 1}, {3, 4, 2}, {0x7FFFFFFF, 0x80000000, 0x40000000},
