@@ -89,6 +89,7 @@ TEST(Files, FailureTable)
     stream = fopen(f.c_str(), "a");
     lseek(fd, 7, SEEK_SET);  // where a failed line count must leave it
     auto write = ZVT_CALL(zv_util_write_named_file(f.c_str(), 1, "data", 4, nullptr));
+    auto sync = ZVT_CALL(zv_util_sync_file(f.c_str()));
     auto read_fd = [&](int from) { return zv_util_read_file(from, &buf, &n, kErr); };
     auto read_path = [&](auto &p) { return zv_util_read_named_file(p.c_str(), &buf, &n, nullptr); };
     // Where offsets are 32 bits every size query refuses 2 GiB or more; with
@@ -116,8 +117,12 @@ TEST(Files, FailureTable)
         {"zv_util_write_named_file", kSys, write, "ferror"},
         {"zv_util_sync,zv_util_write_named_file", kSys, write, "fsync"},
         {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, kAbsent))},
-        {"zv_util_sync_file", kSys, ZVT_CALL(zv_util_sync_file(f.c_str())), "fsync", 2,
-         zvt::kUntouched, "Failed to sync directory file"},
+        {"zv_util_sync_file", kSys, sync, "open", 1, zvt::kUntouched, "Failed to open file"},
+        {"zv_util_sync_file", kSys, sync, "open", 2, zvt::kUntouched, "Failed to open directory"},
+        {"zv_util_sync_file", kSys, sync, "fsync", 1, zvt::kUntouched, "Failed to sync file"},
+        {"zv_util_sync_file", kSys, sync, "fsync", 2, zvt::kUntouched, "Failed to sync directory file"},
+        {"zv_util_get_directory_component,zv_util_sync_file", ZV_ERR_NO_MEMORY, sync, "alloc", 1,
+         zvt::kUntouched, "Failed to get directory component", 2},
         {"zv_util_sync_file", ZV_ERR_BAD_VALUE,  // a path of 1000 bytes
          ZVT_CALL(zv_util_sync_file((f + std::string(999 - f.size(), '/') + "f").c_str()))},
     });

@@ -53,6 +53,7 @@ TEST(PidFile, Claims)
             return status;
         };
     };
+    auto stale = ZVT_CALL((zvt::put_file(path, "x"), zv_util_claim_pid_file(path.c_str(), "", &owner)));
     const char *claim = "zv_util_claim_pid_file", *looked_up = "map_pid_to_exe,zv_util_claim_pid_file";
     zvt::expect_failures({
         // A live holder whose command line begins with the name keeps the file.
@@ -81,6 +82,9 @@ TEST(PidFile, Claims)
         {"write_pid_file", ZV_ERR_SYSTEM, over("999999999"), "fopen", 2},
         {"write_pid_file", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_claim_pid_file(path.c_str(), "", &owner)),
          "fwrite", 1},
+        // The caller's ID reaches the file at the close after a failed flush.
+        {"write_pid_file", ZV_ERR_SYSTEM, stale, "fflush"},
+        {"write_pid_file", ZV_ERR_SYSTEM, stale, "fclose", 2},
     });
     // Only 1 to 10 digits that fit 32 bits name a process to look up (the 4th open).
     const char *contents[] = {"0", "4294967295", "4294967296", "00000000001", "self", "../1", "1\n"};

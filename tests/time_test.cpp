@@ -92,6 +92,9 @@ TEST(Clock, PinnedReadingsAndFailures)
         ROW(kNull, now_str, (nullptr, &size, err)), ROW(kNull, now_str, (text, nullptr, err)),
         ROW(kSys, now_str, (text, &size, err), .point = "time", .err = EIO),
         ROW(kSys, now_str, (text, &size, err), .point = "ctime_r", .err = EIO),
+        ROW(kSys, asctime, (&now, text, 26), .point = "asctime_r"),
+        ROW(kSys, gmtime, (&when, &now), .point = "gmtime_r"),
+        ROW(kSys, get_broken_down_time, (&now), .point = "localtime_r", .log = "Failed to unpick time"),
     });
     // A failed rendering leaves the empty string.
     EXPECT_TRUE(text[0] == '\0' && zv_util_cmp_timeout(&ts, nullptr, err) == kNull) << text;

@@ -32,7 +32,6 @@ struct Rule {
     int err;
 } rules[8];
 unsigned rule_count, open_count;
-bool fired;
 OpenCall opens[512];  // room for a scan of every /proc entry
 std::optional<timespec> pinned;
 
@@ -61,15 +60,12 @@ const bool cache_off = [] {
 
 void fault_arm(const char *point, unsigned nth, int err, unsigned count)
 {
-    fired = false;
     EXPECT_LT(rule_count, std::size(rules)) << "too many points armed";
     if (known(point) && rule_count < std::size(rules))
         rules[rule_count++] = Rule{point, nth, count, 0, err};
 }
 
 void fault_clear() { rule_count = 0; }
-
-bool fault_fired() { return fired; }
 
 unsigned fault_calls(const char *point)
 {
@@ -84,7 +80,7 @@ bool fault_hit(const char *point)
     for (Rule *r = rules; r != rules + rule_count; r++)
         if (std::strcmp(r->point, point) == 0 && ++r->calls >= r->nth &&
             (r->extra == ~0u || r->calls - r->nth <= r->extra))
-            return fired = true, errno = r->err, true;
+            return errno = r->err, true;
     return false;
 }
 
@@ -125,27 +121,6 @@ unsigned open_fd_count()
     return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
 }
 
-void sweep_allocations(const std::function<bool()> &call,
-                       const std::function<void(unsigned nth)> &check_failure)
-{
-    // A first plain run settles one-time allocations and must succeed.
-    ASSERT_TRUE(call()) << "the call fails without any injected fault";
-    for (unsigned nth = 1; !::testing::Test::HasFailure(); nth++) {
-        zv_trace_clear();
-        size_t heap = heap_in_use();
-        unsigned fds = open_fd_count();
-        bool ok = with_fault("alloc", nth, ENOMEM, call);
-        if (!fired) {
-            EXPECT_TRUE(ok && nth > 1) << "no success, or no allocation, after " << nth - 1;
-            return;
-        }
-        EXPECT_FALSE(ok) << "allocation " << nth << " failed, yet the call reported success";
-        EXPECT_EQ(heap, heap_in_use()) << "heap leaked when allocation " << nth << " failed";
-        EXPECT_EQ(fds, open_fd_count()) << "descriptor leaked at allocation " << nth;
-        check_failure(nth);
-    }
-}
-
 // Every test starts with an empty trace and open log and no armed fault.
 struct Reset : ::testing::EmptyTestEventListener {
     void OnTestStart(const ::testing::TestInfo &) override
@@ -179,7 +154,6 @@ WRAP(read, ssize_t, (int a, void *b, size_t c), "read", -1,
 WRAP(write, ssize_t, (int a, const void *b, size_t c), "write", -1,
      HIT("write_idle") ? 0 : __real_write(a, b, c))
 WRAP(fsync, int, (int a), "fsync", -1, __real_fsync(a))
-WRAP(lseek, off_t, (int a, off_t b, int c), "lseek", -1, __real_lseek(a, b, c))
 // "fstat_grown" reports a file 100 bytes larger than it is, as if it had
 // shrunk since it was measured.
 WRAP(fstat64, int, (int a, struct stat64 *b), "fstat", -1,
@@ -192,14 +166,10 @@ WRAP(stat64, int, (const char *a, struct stat64 *b), "stat", -1,
 // "ferror" reports it set; a failing fclose still releases the stream.
 WRAP(fwrite, size_t, (const void *a, size_t b, size_t c, FILE *d), "fwrite",
      (d->_flags |= _IO_ERR_SEEN, 0), __real_fwrite(a, b, c, d))
-WRAP(fread, size_t, (void *a, size_t b, size_t c, FILE *d), "fread",
-     (d->_flags |= _IO_ERR_SEEN, 0), __real_fread(a, b, c, d))
 WRAP(fflush, int, (FILE *a), "fflush", EOF, __real_fflush(a))
 WRAP(ferror, int, (FILE *a), "ferror", 1, __real_ferror(a))
-WRAP(fileno, int, (FILE *a), "fileno", -1, __real_fileno(a))
 WRAP(fclose, int, (FILE *a), "fclose",
      ([&, e = errno] { return __real_fclose(a), errno = e, EOF; }()), __real_fclose(a))
-WRAP(opendir, DIR *, (const char *a), "opendir", nullptr, __real_opendir(a))
 WRAP(scandir64, int,
      (const char *a, dirent64 ***b, int (*c)(const dirent64 *),
       int (*d)(const dirent64 **, const dirent64 **)),
@@ -215,7 +185,6 @@ WRAP(vsnprintf, int, (char *a, size_t b, const char *c, va_list d), "vsnprintf",
 // as a locale changed between measuring and converting would.
 WRAP(mbsrtowcs, size_t, (wchar_t *a, const char **b, size_t c, mbstate_t *d), "mbsrtowcs",
      size_t(-1), __real_mbsrtowcs(a, b, c - (a != nullptr && c > 0 && HIT("mbsrtowcs_short")), d))
-WRAP(waitpid, pid_t, (pid_t a, int *b, int c), "waitpid", -1, __real_waitpid(a, b, c))
 WRAP(sigaction, int, (int a, const struct sigaction *b, struct sigaction *c), "sigaction", -1,
      __real_sigaction(a, b, c))
 WRAP(flock, int, (int a, int b), "flock", -1, __real_flock(a, b))

@@ -22,8 +22,6 @@ inline constexpr const char *kNoFault = "none";
 // |count| further calls fail after it (0: only that one; ~0u: all later ones).
 void fault_arm(const char *point, unsigned nth, int err, unsigned count = 0);
 void fault_clear();
-// Whether an armed fault has fired since the last arm/clear.
-bool fault_fired();
 // Calls seen at |point| since it was armed.
 unsigned fault_calls(const char *point);
 
@@ -57,14 +55,5 @@ std::vector<OpenCall> open_log();  // calls since the last clear, oldest first
 size_t heap_in_use();
 // Open descriptors of this process.
 unsigned open_fd_count();
-
-// Runs |call| once normally, then again with the 1st, 2nd, ... allocation
-// failing, until a run meets no injected failure. |call| returns true on
-// success and must release whatever a success handed out. After each failed
-// run, |check_failure| sees the trace of that run (with the failing
-// allocation's ordinal); the sweep itself checks that the run reported failure
-// and left no heap block or descriptor behind.
-void sweep_allocations(const std::function<bool()> &call,
-                       const std::function<void(unsigned nth)> &check_failure);
 
 }  // namespace zvt

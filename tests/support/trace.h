@@ -119,6 +119,5 @@ inline ::testing::AssertionResult LogIs(
 }  // namespace zvt
 
 #define EXPECT_FRAMES(...) EXPECT_TRUE(::zvt::FramesAre({__VA_ARGS__}))
-#define EXPECT_NO_FRAMES() EXPECT_TRUE(::zvt::FramesAre({}))
 #define EXPECT_STATUS(expected, actual) \
     EXPECT_EQ(::zvt::status_name(expected), ::zvt::status_name(actual))
