@@ -48,6 +48,12 @@ TEST(EnsureEgid, SwitchesTheEffectiveGroupOnly)
          1, zvt::kUntouched, "Failed to query group data"},  // looked up: no such group
         {"ensure_egid", ZV_ERR_SYSTEM, ZVT_CALL(ensure_egid(name.c_str())), "setegid", 1,
          zvt::kUntouched, "Failed to update effective gid: Input/output error"},
+        {"ensure_egid", ZV_ERR_SYSTEM, ZVT_CALL(ensure_egid(name.c_str())), "sysconf", 1,
+         zvt::kUntouched, "Failed to query size: Input/output error"},
+        {"ensure_egid", ZV_ERR_NO_MEMORY, ZVT_CALL(ensure_egid(name.c_str())), "alloc", 1, zvt::kUntouched,
+         "Failed to allocate " + std::to_string(sysconf(_SC_GETGR_R_SIZE_MAX)) + " byte buffer"},
+        {"ensure_egid", ZV_ERR_SYSTEM, ZVT_CALL(ensure_egid(name.c_str())), "getgrnam_r", 1,
+         zvt::kUntouched, "Failed to query group data: Input/output error"},
     });
     EXPECT_EQ(getegid(), own);
     if (geteuid() == 0)
