@@ -11,7 +11,7 @@ static zv_status parse(const std::string &line, zv_proc_stat *record)
     static const int fd = memfd_create("stat", 0);
     static const std::string path = "/proc/self/fd/" + std::to_string(fd);
     CHECK(ftruncate(fd, 0) == 0 && pwrite(fd, line.data(), line.size(), 0) == ssize_t(line.size()));
-    return zv_util_proc_stat(record, path.c_str());
+    return zv::zv_util_proc_stat(record, path.c_str());
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)

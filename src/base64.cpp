@@ -145,6 +145,7 @@ ZV_EXPORT uint32_t zv_util_to_base64_size(uint32_t length)
 ZV_EXPORT zv_status zv_util_base64_encode(const void *input, uint32_t length, char **out,
                                           uint32_t *out_length)
 {
+    // The coder's failures are returned without a frame or a log line.
     if (length > kMaxEncodable)
         return ZV_ERR_NO_MEMORY;
     uint32_t size = zv_util_to_base64_size(length);
@@ -179,7 +180,7 @@ ZV_EXPORT zv_status zv_util_base64_decode(const char *input, uint32_t length, ui
     auto *bytes = static_cast<uint8_t *>(zv::malloc_output(size));
     if (bytes == nullptr) {
         *out = nullptr;
-        return ZV_ERR_NO_MEMORY;
+        return ZV_ERR_NO_MEMORY;  // no frame, as in the encoder
     }
 
     const auto *text = reinterpret_cast<const unsigned char *>(input);

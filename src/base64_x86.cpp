@@ -6,9 +6,7 @@
 #include <immintrin.h>
 
 #include "base64_internal.h"
-
-#define ZV_SSSE3 __attribute__((target("ssse3")))
-#define ZV_AVX2 __attribute__((target("avx2")))
+#include "cpu.h"
 
 namespace zv::base64 {
 namespace {
@@ -24,7 +22,7 @@ constexpr int32_t kKeepSecondFourth = 0x003f03f0, kMoveSecondFourth = 0x01000010
     'a' - 26, '0' - 52, '0' - 52, '0' - 52, '0' - 52, '0' - 52, '0' - 52, '0' - 52, '0' - 52, \
         '0' - 52, '0' - 52, '+' - 62, '/' - 63, 'A', 0, 0
 
-ZV_SSSE3 inline __m128i encode_lane(__m128i in)
+ZV_TARGET("ssse3") inline __m128i encode_lane(__m128i in)
 {
     in = _mm_shuffle_epi8(in, _mm_setr_epi8(1, 0, 2, 1, 4, 3, 5, 4, 7, 6, 8, 7, 10, 9, 11, 10));
     __m128i values = _mm_or_si128(
@@ -38,7 +36,7 @@ ZV_SSSE3 inline __m128i encode_lane(__m128i in)
     return _mm_add_epi8(_mm_shuffle_epi8(_mm_setr_epi8(ZV_ENCODE_OFFSETS), range), values);
 }
 
-ZV_AVX2 inline __m256i encode_lanes(__m256i in)
+ZV_TARGET("avx2") inline __m256i encode_lanes(__m256i in)
 {
     const __m256i spread = _mm256_setr_epi8(1, 0, 2, 1, 4, 3, 5, 4, 7, 6, 8, 7, 10, 9, 11, 10,  //
                                             1, 0, 2, 1, 4, 3, 5, 4, 7, 6, 8, 7, 10, 9, 11, 10);
@@ -72,7 +70,7 @@ constexpr int32_t kPairValues = 0x01400140, kPairPairs = 0x00011000;
 
 // The lane's 12 bytes in its low bytes, or false when a character lies outside
 // the alphabet.
-ZV_SSSE3 inline bool decode_lane(__m128i in, __m128i *out)
+ZV_TARGET("ssse3") inline bool decode_lane(__m128i in, __m128i *out)
 {
     __m128i high = _mm_and_si128(_mm_srli_epi32(in, 4), _mm_set1_epi8(0x0f));
     __m128i low = _mm_and_si128(in, _mm_set1_epi8(0x0f));
@@ -90,7 +88,7 @@ ZV_SSSE3 inline bool decode_lane(__m128i in, __m128i *out)
     return true;
 }
 
-ZV_AVX2 inline bool decode_lanes(__m256i in, __m256i *out)
+ZV_TARGET("avx2") inline bool decode_lanes(__m256i in, __m256i *out)
 {
     __m256i high = _mm256_and_si256(_mm256_srli_epi32(in, 4), _mm256_set1_epi8(0x0f));
     __m256i low = _mm256_and_si256(in, _mm256_set1_epi8(0x0f));
@@ -114,7 +112,7 @@ ZV_AVX2 inline bool decode_lanes(__m256i in, __m256i *out)
 
 }  // namespace
 
-ZV_SSSE3 size_t encode_ssse3(const uint8_t *in, size_t n, char *out)
+ZV_TARGET("ssse3") size_t encode_ssse3(const uint8_t *in, size_t n, char *out)
 {
     size_t i = 0;
     for (; n - i >= 16; i += 12, out += 16) {
@@ -124,7 +122,7 @@ ZV_SSSE3 size_t encode_ssse3(const uint8_t *in, size_t n, char *out)
     return i;
 }
 
-ZV_AVX2 size_t encode_avx2(const uint8_t *in, size_t n, char *out)
+ZV_TARGET("avx2") size_t encode_avx2(const uint8_t *in, size_t n, char *out)
 {
     size_t i = 0;
     for (; n - i >= 28; i += 24, out += 32) {  // lanes at +0 and +12, 16 bytes each
@@ -136,7 +134,8 @@ ZV_AVX2 size_t encode_avx2(const uint8_t *in, size_t n, char *out)
     return i + encode_ssse3(in + i, n - i, out);
 }
 
-ZV_SSSE3 size_t decode_ssse3(const unsigned char *in, size_t n, uint8_t *out, size_t room)
+ZV_TARGET("ssse3")
+size_t decode_ssse3(const unsigned char *in, size_t n, uint8_t *out, size_t room)
 {
     size_t i = 0;
     __m128i bytes;
@@ -148,7 +147,8 @@ ZV_SSSE3 size_t decode_ssse3(const unsigned char *in, size_t n, uint8_t *out, si
     return i;
 }
 
-ZV_AVX2 size_t decode_avx2(const unsigned char *in, size_t n, uint8_t *out, size_t room)
+ZV_TARGET("avx2")
+size_t decode_avx2(const unsigned char *in, size_t n, uint8_t *out, size_t room)
 {
     size_t i = 0;
     __m256i bytes;

@@ -8,6 +8,9 @@
 
 #include "internal.h"
 
+// Compiles one function for the named processor features, e.g. ZV_TARGET("avx2").
+#define ZV_TARGET(features) __attribute__((target(features)))
+
 namespace zv::cpu {
 
 enum : uint32_t {

@@ -92,11 +92,8 @@ ZV_EXPORT zv_status zv_util_getopt_from(int32_t argc, char *const argv[],
             ++i;
             continue;
         }
-        if (zv_status status = process_option(record, argv, argc, &i); status != ZV_OK) {
-            // The parse answers a failed option with two frames of its own.
-            (void)ZV_FAIL(status);
-            return ZV_FAIL(status);
-        }
+        if (zv_status status = process_option(record, argv, argc, &i); status != ZV_OK)
+            return ZV_FAIL_TWICE(status);
     }
     return ZV_OK;
 }
@@ -113,10 +110,9 @@ ZV_EXPORT zv_status zv_util_getopt_string(const zv_util_option *record, const ch
     const uint32_t length = zv_util_strnlen(value, kMaxValueLength + 1);
     if (length > kMaxValueLength)
         return ZV_FAIL(ZV_ERR_BAD_VALUE);
-    auto *copy = static_cast<char *>(std::calloc(length + 1, 1));
+    char *copy = zv::copy_text(value, length);
     if (copy == nullptr)
         return ZV_FAIL(ZV_ERR_NO_MEMORY);
-    std::memcpy(copy, value, length + 1);
     *destination = copy;
     *consumed = 2;
     return ZV_OK;

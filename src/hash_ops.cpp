@@ -113,7 +113,7 @@ uint64_t absorb_plain(uint64_t state, const unsigned char *bytes, uint32_t block
 #if defined(__i386__)
 // Plain i386 code spends two or three instructions on each 64-bit shift; one
 // SSE2 lane does the chain at one operation per step.
-__attribute__((target("sse2"))) inline __m128i mix_lane(__m128i x)
+ZV_TARGET("sse2") inline __m128i mix_lane(__m128i x)
 {
     x = _mm_xor_si128(x, _mm_slli_epi64(x, 10));
     x = _mm_xor_si128(x, _mm_srli_epi64(x, 15));
@@ -121,12 +121,12 @@ __attribute__((target("sse2"))) inline __m128i mix_lane(__m128i x)
     return _mm_xor_si128(x, _mm_srli_epi64(x, 13));
 }
 
-__attribute__((target("sse2"))) inline __m128i block_lane(const unsigned char *bytes)
+ZV_TARGET("sse2") inline __m128i block_lane(const unsigned char *bytes)
 {
     return _mm_loadl_epi64(reinterpret_cast<const __m128i *>(bytes));
 }
 
-__attribute__((target("sse2"))) uint64_t absorb_sse2(uint64_t state, const unsigned char *bytes,
+ZV_TARGET("sse2") uint64_t absorb_sse2(uint64_t state, const unsigned char *bytes,
                                                      uint32_t blocks)
 {
     __m128i lane = _mm_loadl_epi64(reinterpret_cast<const __m128i *>(&state));

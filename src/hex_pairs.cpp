@@ -12,7 +12,7 @@ namespace {
 
 #define ZV_HEX_DIGITS '0', '1', '2', '3', '4', '5', '6', '7', '8', '9', 'a', 'b', 'c', 'd', 'e', 'f'
 
-__attribute__((target("ssse3"))) size_t put_hex_ssse3(char *out, const uint8_t *bytes, size_t n)
+ZV_TARGET("ssse3") size_t put_hex_ssse3(char *out, const uint8_t *bytes, size_t n)
 {
     const __m128i digits = _mm_setr_epi8(ZV_HEX_DIGITS);
     const __m128i nibble = _mm_set1_epi8(0x0f);
@@ -28,7 +28,7 @@ __attribute__((target("ssse3"))) size_t put_hex_ssse3(char *out, const uint8_t *
     return i;
 }
 
-__attribute__((target("avx2"))) size_t put_hex_avx2(char *out, const uint8_t *bytes, size_t n)
+ZV_TARGET("avx2") size_t put_hex_avx2(char *out, const uint8_t *bytes, size_t n)
 {
     const __m256i digits = _mm256_setr_epi8(ZV_HEX_DIGITS, ZV_HEX_DIGITS);
     const __m256i nibble = _mm256_set1_epi8(0x0f);

@@ -1,5 +1,10 @@
 // Library-internal helpers shared by every family: the failure convention,
 // owning handles and small utilities. Nothing here is exported.
+//
+// Every internal function lives in namespace zv, or in an unnamed namespace
+// when one source uses it. A helper that records trace frames or log lines
+// keeps the name callers see in them (__func__ is the unqualified name, as in
+// zv::map_pid_to_exe): renaming it changes the library's observable output.
 #pragma once
 
 #include <zverrortrace.h>
@@ -10,6 +15,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <memory>
 #include <unistd.h>
 
@@ -36,11 +42,55 @@ inline void set_errno_out(int32_t *errno_out, int value)
         *errno_out = value;
 }
 
+// A new NUL-terminated copy of the |length| bytes at |text|; NULL when the
+// block cannot be allocated.
+inline char *copy_text(const char *text, size_t length)
+{
+    auto *copy = static_cast<char *>(std::malloc(length + 1));
+    if (copy != nullptr) {
+        std::memcpy(copy, text, length);
+        copy[length] = '\0';
+    }
+    return copy;
+}
+
+// Releases |count| heap blocks (last first) and the heap array that holds
+// them.
+template <class T>
+void free_array(T **items, size_t count)
+{
+    while (count > 0)
+        std::free(items[--count]);
+    std::free(items);
+}
+
 struct FreeDeleter {
     void operator()(void *block) const noexcept { std::free(block); }
 };
 template <class T>
 using unique_malloc = std::unique_ptr<T, FreeDeleter>;
+
+// Hands a callee's `T **` result to an owner: `callee(out_block(owner))`
+// leaves whatever block the callee stored, NULL included, owned by |owner| at
+// the end of the statement.
+template <class T>
+class OutBlock {
+public:
+    explicit OutBlock(unique_malloc<T> &owner) : owner_(owner) {}
+    OutBlock(const OutBlock &) = delete;
+    OutBlock &operator=(const OutBlock &) = delete;
+    ~OutBlock() { owner_.reset(block_); }
+    operator T **() { return &block_; }
+
+private:
+    unique_malloc<T> &owner_;
+    T *block_ = nullptr;
+};
+template <class T>
+OutBlock<T> out_block(unique_malloc<T> &owner)
+{
+    return OutBlock<T>(owner);
+}
 
 struct FileCloser {
     void operator()(FILE *stream) const noexcept { std::fclose(stream); }
@@ -97,6 +147,19 @@ private:
 
 // Records a frame for the enclosing function and yields |status|.
 #define ZV_FAIL(status) ::zv::record_frame((status), __func__, ZV_SOURCE_FILE, __LINE__)
+
+// A failed system call: its errno through |errno_out| (when given), then the
+// frame.
+#define ZV_ERRNO_FAIL(status, errno_out)                                                  \
+    (::zv::set_errno_out((errno_out), errno), ZV_FAIL(status))
+
+// A callee's failure that this function answers with two frames of its own
+// (the option parse, the /proc lookup of a PID file's owner).
+#define ZV_FAIL_TWICE(status) ((void)ZV_FAIL(status), ZV_FAIL(status))
+
+// Log formats are passed as the messages give them; some end in "\n", some
+// do not. The logger drops one trailing newline, so both forms deliver the
+// same line.
 
 // A failure the function detects itself: log line (level 3) first, then frame.
 #define ZV_LOG_FAIL(status, ...)                                                          \

@@ -36,26 +36,22 @@ bool set_disposition(int sig, void (*handler)(int))
 struct ScanList {
     struct dirent64 **entries = nullptr;
     int count = 0;
-    ~ScanList()
-    {
-        for (int i = 0; i < count; i++)
-            std::free(entries[i]);
-        std::free(entries);
-    }
+    ~ScanList() { zv::free_array(entries, static_cast<size_t>(count)); }
 };
 
-// Reads the head of the command line at |path| into |buffer| (NUL-terminated).
-// False when the process is gone or its command line cannot be read.
-bool read_cmdline(const char *path, char (&buffer)[kCmdlineBuffer])
-{
-    zv::unique_fd fd(open(path, O_RDONLY | O_CLOEXEC));
-    if (!fd)
-        return false;
-    std::memset(buffer, 0, sizeof buffer);
-    return read(fd.get(), buffer, sizeof buffer - 1) >= 0;
-}
-
 }  // namespace
+
+namespace zv {
+
+zv_status open_cmdline(const char *pid_text, unique_fd &fd)
+{
+    unique_malloc<char> path;
+    zv_status status =
+        zv_util_asprintf(out_block(path), nullptr, "/proc/%s/cmdline", pid_text);
+    if (status == ZV_OK)
+        fd.reset(open(path.get(), O_RDONLY | O_CLOEXEC));
+    return status;
+}
 
 int vet_possible_directory(const struct dirent64 *entry)
 {
@@ -65,14 +61,11 @@ int vet_possible_directory(const struct dirent64 *entry)
         if (!std::isdigit(static_cast<unsigned char>(*c)))
             return 0;
     }
-    char *path = nullptr;
-    zv_status status = zv_util_asprintf(&path, nullptr, "/proc/%s/cmdline", entry->d_name);
-    if (status != ZV_OK) {
+    unique_fd fd;
+    if (zv_status status = open_cmdline(entry->d_name, fd); status != ZV_OK) {
         ZV_FAIL_THEN_LOG(status, "Failed to allocate path\n");
         return 0;
     }
-    zv::unique_malloc<char> owned_path(path);
-    zv::unique_fd fd(open(path, O_RDONLY | O_CLOEXEC));
     return fd ? 1 : 0;
 }
 
@@ -95,7 +88,7 @@ zv_status zv_util_pid_of(const char *name, int match_mode, uint32_t **pids_out,
         return ZV_OK;
     }
 
-    zv::unique_malloc<uint32_t> pids;
+    unique_malloc<uint32_t> pids;
     if (pids_out != nullptr) {
         pids.reset(static_cast<uint32_t *>(std::calloc(scan.count, sizeof(uint32_t))));
         if (!pids)
@@ -104,14 +97,12 @@ zv_status zv_util_pid_of(const char *name, int match_mode, uint32_t **pids_out,
     uint32_t matches = 0;
     for (int i = 0; i < scan.count; i++) {
         const char *entry_name = scan.entries[i]->d_name;
-        char *path = nullptr;
-        zv_status status = zv_util_asprintf(&path, nullptr, "/proc/%s/cmdline", entry_name);
-        if (status != ZV_OK)
+        unique_fd fd;
+        if (zv_status status = open_cmdline(entry_name, fd); status != ZV_OK)
             return ZV_FAIL_THEN_LOG(status, "Failed to allocate path\n");
-        zv::unique_malloc<char> owned_path(path);
         // A process that ended since the scan is skipped.
-        char cmdline[kCmdlineBuffer];
-        if (!read_cmdline(path, cmdline))
+        char cmdline[kCmdlineBuffer] = {};
+        if (!fd || read(fd.get(), cmdline, sizeof cmdline - 1) < 0)
             continue;
         bool match = match_mode == 1 ? std::strcmp(cmdline, name) == 0
                                      : std::strstr(cmdline, name) != nullptr;
@@ -149,12 +140,15 @@ zv_status zv_util_await_child_timeout(pid_t pid, int32_t timeout_seconds)
     }
 }
 
+}  // namespace zv
+
 extern "C" {
 
 ZV_EXPORT zv_status zv_util_ignore_signal(int sig)
 {
     if (never_ignored(sig) || sig < 1 || sig > kLastClassicSignal)
         return ZV_OK;
+    // The signal functions report a failed sigaction without a frame.
     return set_disposition(sig, SIG_IGN) ? ZV_OK : ZV_ERR_SYSTEM;
 }
 
@@ -172,7 +166,7 @@ ZV_EXPORT zv_status zv_util_reset_signal(int sig)
 {
     if (sig < 1 || sig > kLastClassicSignal)
         return ZV_LOG_FAIL(ZV_ERR_BAD_VALUE, "Invalid or unsupported signal value");
-    return set_disposition(sig, SIG_DFL) ? ZV_OK : ZV_ERR_SYSTEM;
+    return set_disposition(sig, SIG_DFL) ? ZV_OK : ZV_ERR_SYSTEM;  // no frame, as above
 }
 
 }  // extern "C"

@@ -28,13 +28,6 @@ const char *field_end(const char *field, const char *end, const char *separator)
     return next != nullptr ? next : end;
 }
 
-void release_fields(char **fields, uint32_t made)
-{
-    while (made > 0)
-        std::free(fields[--made]);
-    std::free(fields);
-}
-
 // Sums the lengths as the size check sees them: a separator after every
 // string. ZV_ERR_OVERFLOW as soon as the total passes 32 bits.
 zv_status measure_join(const char *const *strings, uint32_t count, size_t m, uint32_t *total)
@@ -106,15 +99,12 @@ ZV_EXPORT zv_status zv_util_split(const char *text, const char *separator, char 
     uint32_t made = 0;
     for (p = next_field(text, end, separator, m); p != nullptr;) {
         const char *stop = field_end(p, end, separator);
-        size_t length = static_cast<size_t>(stop - p);
-        auto *field = static_cast<char *>(std::malloc(length + 1));
+        char *field = zv::copy_text(p, static_cast<size_t>(stop - p));
         if (field == nullptr) {
-            release_fields(fields, made);
+            zv::free_array(fields, made);
             *fields_out = nullptr;
             return ZV_LOG_FAIL(ZV_ERR_NO_MEMORY, "Failed to allocate memory\n");
         }
-        std::memcpy(field, p, length);
-        field[length] = '\0';
         fields[made++] = field;
         p = next_field(stop, end, separator, m);
     }

@@ -169,8 +169,8 @@ TEST(NamedFiles, WriteAppendReadCopySyncAndCloseOnExec)
                   zv_util_query_file_exists(g.c_str(), &gone) +
                   zv_util_claim_pid_file(g.c_str(), "app", &owner) +  // created, then taken over
                   zv_util_claim_pid_file(g.c_str(), "app", &owner) +
-                  zv_util_pid_of("no-such-program", 0, &pids, &count) +
-                  zv_util_proc_stat(&proc, getpid()), ZV_OK);
+                  zv::zv_util_pid_of("no-such-program", 0, &pids, &count) +
+                  zv::zv_util_proc_stat(&proc, getpid()), ZV_OK);
     EXPECT_EQ(size * 100 + exists * 10 + gone, 110);
     std::free(pids);
     // What the library opens for itself is close-on-exec, so a child another thread

@@ -168,7 +168,7 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
             {"zv_wait", ZV_ERR_NULL_ARG, ZVT_CALL(zv_wait(&none, &code))},
             {"zv_wait", ZV_ERR_SYSTEM, ZVT_CALL(zv_wait(&handle, &code))},
             {"zv_wait", ZV_ERR_SYSTEM, ZVT_CALL(zv_spawn_and_wait(run_true, env, &code))},
-            {"zv_util_await_child_timeout", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_await_child_timeout(1, 5)),
+            {"zv_util_await_child_timeout", ZV_ERR_SYSTEM, ZVT_CALL(zv::zv_util_await_child_timeout(1, 5)),
              nullptr, 1, kUntouched, "Failed to wait for child"},
         });
         EXPECT_TRUE(handle != nullptr && code == 7 && none == nullptr) << "a failed wait keeps the handle";
@@ -181,7 +181,7 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
 std::vector<uint32_t> lookup(const std::string &name, int mode)
 {
     uint32_t *pids = nullptr, count = 12345;
-    EXPECT_EQ(zv_util_pid_of(name.c_str(), mode, &pids, &count), ZV_OK);
+    EXPECT_EQ(zv::zv_util_pid_of(name.c_str(), mode, &pids, &count), ZV_OK);
     std::vector<uint32_t> result(pids, pids + count);
     std::free(pids);
     return result;
@@ -202,7 +202,7 @@ TEST(PidOf, MatchModesOrderFilterAndFailures)
     // A fragment is no exact match; nothing past the compared head matches.
     EXPECT_TRUE(lookup(name.substr(4), 1).empty() && lookup(longer, 0).empty());
     uint32_t *pids = reinterpret_cast<uint32_t *>(1), count = 0;
-    EXPECT_TRUE(zv_util_pid_of(name.c_str(), 1, nullptr, &count) == ZV_OK && count == 1);
+    EXPECT_TRUE(zv::zv_util_pid_of(name.c_str(), 1, nullptr, &count) == ZV_OK && count == 1);
     // A zombie's command line is empty: an empty name matches it exactly,
     // and as a fragment every process, the first /proc entry included.
     auto has = [](auto &pids, uint32_t pid) { return std::count(pids.begin(), pids.end(), pid) == 1; };
@@ -215,7 +215,7 @@ TEST(PidOf, MatchModesOrderFilterAndFailures)
 
     zvt::LogCapture log;
     zvt::fault_arm("open", 1, EACCES, ~0u);  // no command line opens: nothing qualifies
-    EXPECT_EQ(zv_util_pid_of("", 0, &pids, &count), ZV_OK);
+    EXPECT_EQ(zv::zv_util_pid_of("", 0, &pids, &count), ZV_OK);
     zvt::fault_clear();
     EXPECT_TRUE(count == 0 && pids == nullptr && zvt::LogIs(log, {{7, "Nothing suitable in /proc"}}));
 
@@ -224,29 +224,29 @@ TEST(PidOf, MatchModesOrderFilterAndFailures)
                                     {DT_DIR, "self", 0}, {DT_DIR, kSelf, 1}, {DT_DIR, "999999999", 0}}) {
         entry.d_type = static_cast<unsigned char>(type);
         std::strcpy(entry.d_name, name.c_str());
-        EXPECT_EQ(vet_possible_directory(&entry), keep) << name;
+        EXPECT_EQ(zv::vet_possible_directory(&entry), keep) << name;
     }
     zvt::expect_failures({
-        {"zv_util_pid_of", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_pid_of("", 0, nullptr, &count)), "scandir", 1,
+        {"zv_util_pid_of", ZV_ERR_SYSTEM, ZVT_CALL(zv::zv_util_pid_of("", 0, nullptr, &count)), "scandir", 1,
          kUntouched, "Failed to open /proc"},
         // The filter drops (0) an entry whose path cannot be formatted.
         {"zv_util_vasprintf,vet_possible_directory", ZV_ERR_NO_MEMORY,
-         [&] { return vet_possible_directory(&entry) == 0 ? ZV_ERR_NO_MEMORY : ZV_OK; }, "alloc", 1,
+         [&] { return zv::vet_possible_directory(&entry) == 0 ? ZV_ERR_NO_MEMORY : ZV_OK; }, "alloc", 1,
          kUntouched, "Failed to allocate path", 2},
     });
 }
 
 TEST(AwaitChild, EndsOrIsKilledAtTheDeadline)
 {
-    EXPECT_EQ(zv_util_await_child_timeout(zombie(), 5), ZV_OK);
+    EXPECT_EQ(zv::zv_util_await_child_timeout(zombie(), 5), ZV_OK);
     pid_t late = fork();
     if (late == 0) _exit(usleep(100000));
-    EXPECT_EQ(zv_util_await_child_timeout(late, 30), ZV_OK) << "ended while waited for";
+    EXPECT_EQ(zv::zv_util_await_child_timeout(late, 30), ZV_OK) << "ended while waited for";
     // At the deadline the child is killed; a clock that cannot be read counts as past it.
     for (int32_t timeout : {0, 30}) {
         pid_t sleeper = zvt::start_sleeper("zvt-await");
         zvt::fault_arm("clock_gettime", timeout == 0 ? 100 : 2, EINVAL);
-        EXPECT_STATUS(ZV_ERR_TIMEOUT, zv_util_await_child_timeout(sleeper, timeout));
+        EXPECT_STATUS(ZV_ERR_TIMEOUT, zv::zv_util_await_child_timeout(sleeper, timeout));
         zvt::fault_clear();
         int status = 0;
         EXPECT_TRUE(waitpid(sleeper, &status, 0) == sleeper && WTERMSIG(status) == SIGKILL);
@@ -265,7 +265,7 @@ TEST(ProcStat, StatLinesAndThreadIds)
                   "20 -5 1 0 5000000000 123456789 -1 18446744073709551615 94558123456512 "
                   "4294967296 3000 4000 5000 0 65536 4096 17 0 0 0 17 3 0 2 9000000000\n");
     zv_proc_stat st;
-    ASSERT_EQ(zv_util_proc_stat(&st, path.c_str()), ZV_OK);
+    ASSERT_EQ(zv::zv_util_proc_stat(&st, path.c_str()), ZV_OK);
     // "-5" keeps its two's-complement pattern; beyond 32 bits a field saturates.
     EXPECT_EQ(std::make_tuple(st.pid, st.state, st.ppid, st.flags, st.exit_signal, st.policy, st.starttime),
               std::make_tuple(4242, 'S', 1, 4194560u, 17, 2u, uint64_t{5000000000}));
@@ -273,10 +273,10 @@ TEST(ProcStat, StatLinesAndThreadIds)
               std::make_tuple(static_cast<uint32_t>(-5), 123456789u, -1, 4294967295u, 4294967295u,
                               uint64_t{9000000000}));
     zvt::expect_failures({
-        {"zv_util_proc_stat", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_proc_stat(nullptr, 0)), nullptr, 1,
+        {"zv_util_proc_stat", ZV_ERR_NULL_ARG, ZVT_CALL(zv::zv_util_proc_stat(nullptr, 0)), nullptr, 1,
          kUntouched, "ret_proc_stat is NULL"},
-        {"zv_util_proc_stat", ZV_ERR_OPEN_FAILED, ZVT_CALL(zv_util_proc_stat(&st, -1))},
-        {"zv_util_proc_stat", ZV_ERR_IO, ZVT_CALL(zv_util_proc_stat(&st, "/dev/null")), nullptr, 1,
+        {"zv_util_proc_stat", ZV_ERR_OPEN_FAILED, ZVT_CALL(zv::zv_util_proc_stat(&st, -1))},
+        {"zv_util_proc_stat", ZV_ERR_IO, ZVT_CALL(zv::zv_util_proc_stat(&st, "/dev/null")), nullptr, 1,
          kUntouched, "getline() failed: Success"},
     });
     EXPECT_EQ(std::memcmp(&st, std::array<char, sizeof st>{}.data(), sizeof st), 0);
@@ -284,12 +284,12 @@ TEST(ProcStat, StatLinesAndThreadIds)
     // fills getline's first 120-byte buffer: nothing past its end may be looked at.
     zvt::put_file(path, "1 (" + std::string(110, 'x') + ") R 9\n");
     zvt::expect_failures({{"zv_util_proc_stat", ZV_ERR_SYSTEM,
-                           ZVT_CALL(zv_util_proc_stat(&st, path.c_str())), nullptr, 1, kUntouched,
+                           ZVT_CALL(zv::zv_util_proc_stat(&st, path.c_str())), nullptr, 1, kUntouched,
                            "Parsing logic failed, j=120, len=120"}});
     EXPECT_EQ(std::make_tuple(st.pid, st.state, st.ppid, st.pgrp), std::make_tuple(1, 'R', 9, 0));
 
-    EXPECT_TRUE(zv_util_proc_stat(&st, 0) == ZV_OK && st.pid == getpid());  // the caller
-    EXPECT_TRUE(zv_util_proc_stat(&st, getppid()) == ZV_OK && st.pid == getppid());
+    EXPECT_TRUE(zv::zv_util_proc_stat(&st, 0) == ZV_OK && st.pid == getpid());  // the caller
+    EXPECT_TRUE(zv::zv_util_proc_stat(&st, getppid()) == ZV_OK && st.pid == getppid());
     EXPECT_EQ(zv_util_tid(), getpid());
 }
 

@@ -46,7 +46,7 @@ TEST(Deadline, OffsetExpiryOrderAndTimeLeft)
              {{50, 499999999}, -1, "-1.000000e-09"}, {{52, 250000000}, 1, "1.750000e+00"},
              {{49, 750000000}, -1, "-7.500000e-01"}}) {
         uint32_t expired = 7; int32_t cmp = 7; char text[32];
-        EXPECT_EQ(zv_util_query_timeout_expired(&deadline, &expired) |
+        EXPECT_EQ(zv::zv_util_query_timeout_expired(&deadline, &expired) |
                       zv_util_query_timeout_left(&deadline, text, 32) |
                       zv_util_cmp_timeout(&deadline, &now, &cmp), kOk);
         EXPECT_TRUE(expired == (order < 1) && cmp == order && text == left + " seconds") << text;

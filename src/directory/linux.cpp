@@ -89,22 +89,15 @@ ZV_EXPORT char *zv_dirscan_file_name(zv_util_dirscan_state *scan)
     if (scan == nullptr || scan->current < 0 || scan->current >= scan->entry_count)
         return nullptr;
     const char *name = scan->entries[scan->current]->d_name;
-    size_t length = std::strlen(name);
-    auto *copy = static_cast<char *>(std::malloc(length + 1));
-    if (copy != nullptr)
-        std::memcpy(copy, name, length + 1);
-    return copy;
+    return zv::copy_text(name, std::strlen(name));
 }
 
 ZV_EXPORT void zv_util_dirscan_end(zv_util_dirscan_state *scan)
 {
     if (scan == nullptr)
         return;
-    if (scan->entries != nullptr) {
-        for (int32_t i = 0; i < scan->entry_count; i++)
-            std::free(scan->entries[i]);
-        std::free(scan->entries);
-    }
+    if (scan->entries != nullptr)
+        zv::free_array(scan->entries, static_cast<size_t>(scan->entry_count));
     std::free(scan);
 }
 

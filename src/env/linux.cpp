@@ -2,8 +2,6 @@
 #include <zvutil/memory.h>
 #include <zvutil/system.h>
 
-#include <cstring>
-
 #include "internal.h"
 
 namespace {
@@ -25,12 +23,7 @@ ZV_EXPORT char *zv_util_getenv(const char *name)
     uint32_t length = zv_util_strnlen(value, kMaxValueLength + 1);
     if (length > kMaxValueLength)
         return nullptr;
-    char *copy = static_cast<char *>(std::malloc(length + 1));
-    if (copy == nullptr)
-        return nullptr;
-    std::memcpy(copy, value, length);
-    copy[length] = '\0';
-    return copy;
+    return zv::copy_text(value, length);
 }
 
 ZV_EXPORT zv_status zv_util_setenv(const char *name, const char *value)

@@ -18,20 +18,16 @@ ZV_EXPORT zv_status zv_util_fopen(FILE **stream_out, int32_t *errno_out, const c
 {
     if (stream_out == nullptr || mode == nullptr || format == nullptr)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
-    char *text = nullptr;
+    FILE *stream = nullptr;
     va_list args;
     va_start(args, format);
-    zv_status status = zv_util_vasprintf(&text, format, args, errno_out);
+    zv::OpenedPath opened = zv::open_formatted(format, args, errno_out, [&](const char *path) {
+        stream = zv::zv_util_open_stream(path, mode);
+        return stream != nullptr;
+    });
     va_end(args);
-    if (status != ZV_OK)
-        return ZV_FAIL(status);
-    zv::unique_malloc<char> path(text);
-
-    FILE *stream = zv_util_open_stream(path.get(), mode);
-    if (stream == nullptr) {
-        zv::set_errno_out(errno_out, errno);
-        return ZV_FAIL(ZV_ERR_SYSTEM);
-    }
+    if (opened.status != ZV_OK)
+        return ZV_FAIL(opened.status);
     *stream_out = stream;
     return ZV_OK;
 }
@@ -50,7 +46,7 @@ ZV_EXPORT zv_status zv_util_read_named_file(const char *path, char **buf_out, ui
     auto size = static_cast<uint32_t>(measured);
     *size_out = size;
 
-    zv::unique_file stream(zv_util_open_stream(path, "rbe"));
+    zv::unique_file stream(zv::zv_util_open_stream(path, "rbe"));
     if (!stream)
         return ZV_FAIL(ZV_ERR_SYSTEM);
     zv::unique_malloc<char> buffer(static_cast<char *>(std::malloc(size_t{size} + 1)));
@@ -82,13 +78,12 @@ ZV_EXPORT zv_status zv_util_write_named_file(const char *path, int32_t truncate,
 {
     if (path == nullptr || data == nullptr)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
-    char *text = nullptr;
-    zv_status status = zv_util_get_directory_component(path, &text);
+    zv::unique_malloc<char> directory;
+    zv_status status = zv_util_get_directory_component(path, zv::out_block(directory));
     if (status != ZV_OK)
         return ZV_FAIL(status);
-    zv::unique_malloc<char> directory(text);
 
-    zv::unique_file stream(zv_util_open_stream(path, truncate != 0 ? "wbe" : "abe"));
+    zv::unique_file stream(zv::zv_util_open_stream(path, truncate != 0 ? "wbe" : "abe"));
     if (!stream)
         return ZV_FAIL(ZV_ERR_SYSTEM);
     std::clearerr(stream.get());
@@ -117,12 +112,11 @@ ZV_EXPORT zv_status zv_util_copy_file(const char *src_path, const char *dst_path
         return ZV_FAIL(ZV_ERR_NULL_ARG);
     // The whole source is in memory before the destination is emptied, so a
     // file copied onto itself keeps its content.
-    char *text = nullptr;
+    zv::unique_malloc<char> content;
     uint32_t size = 0;
-    zv_status status = zv_util_read_named_file(src_path, &text, &size, nullptr);
+    zv_status status = zv_util_read_named_file(src_path, zv::out_block(content), &size, nullptr);
     if (status != ZV_OK)
         return status;
-    zv::unique_malloc<char> content(text);
     return zv_util_write_named_file(dst_path, 1, content.get(), size, nullptr);
 }
 

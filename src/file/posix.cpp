@@ -24,13 +24,17 @@ constexpr int32_t kLargestSize = INT32_MAX;
 // 32 bits. Where offsets are 32 bits the size bound of the ordinary interface
 // is applied here instead, so a file of 2 GiB or more still fails with
 // EOVERFLOW.
+bool past_size_bound(const struct stat64 &st)
+{
+    if (st.st_size <= kLargestSize)
+        return false;
+    errno = EOVERFLOW;
+    return true;
+}
+
 int apply_size_bound(int result, const struct stat64 &st)
 {
-    if (result == 0 && sizeof(off_t) < sizeof(st.st_size) && st.st_size > kLargestSize) {
-        errno = EOVERFLOW;
-        return -1;
-    }
-    return result;
+    return result == 0 && sizeof(off_t) < sizeof(st.st_size) && past_size_bound(st) ? -1 : result;
 }
 
 int fd_status(int fd, struct stat64 *st)
@@ -48,7 +52,7 @@ int path_status(const char *path, struct stat64 *st)
 // compares) a counter could wrap.
 constexpr size_t kMaxNewlineRun = 255 * 16;
 
-__attribute__((target("sse2"))) uint32_t count_newlines_sse2(const char *bytes, size_t n)
+ZV_TARGET("sse2") uint32_t count_newlines_sse2(const char *bytes, size_t n)
 {
     const __m128i newline = _mm_set1_epi8('\n');
     __m128i counters = _mm_setzero_si128();
@@ -79,21 +83,18 @@ ZV_EXPORT zv_status zv_util_open(int32_t *fd_out, int32_t *errno_out, int32_t fl
 {
     if (fd_out == nullptr || format == nullptr)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
-    char *text = nullptr;
     va_list args;
     va_start(args, format);
-    zv_status status = zv_util_vasprintf(&text, format, args, errno_out);
-    va_end(args);
-    if (status != ZV_OK)
-        return status;  // the formatter has recorded the frame
-    zv::unique_malloc<char> path(text);
-
     // Always the three-argument form; the flags go through untouched.
-    *fd_out = ::open(path.get(), flags, static_cast<mode_t>(mode));
-    if (*fd_out < 0) {
-        zv::set_errno_out(errno_out, errno);
-        return ZV_FAIL(ZV_ERR_SYSTEM);
-    }
+    zv::OpenedPath opened = zv::open_formatted(format, args, errno_out, [&](const char *path) {
+        *fd_out = ::open(path, flags, static_cast<mode_t>(mode));
+        return *fd_out >= 0;
+    });
+    va_end(args);
+    if (!opened.formatted)
+        return opened.status;  // the formatter has recorded the frame
+    if (opened.status != ZV_OK)
+        return ZV_FAIL(opened.status);
     return ZV_OK;
 }
 
@@ -109,10 +110,8 @@ ZV_EXPORT zv_status zv_util_whole_write(int32_t fd, const void *buf, int32_t len
     int idle = kIdleBudget;
     while (offset < len) {
         ssize_t n = ::write(fd, bytes + offset, static_cast<size_t>(len - offset));
-        if (n < 0) {
-            zv::set_errno_out(errno_out, errno);
-            return ZV_FAIL(ZV_ERR_SYSTEM);
-        }
+        if (n < 0)
+            return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
         if (n == 0) {
             if (--idle == 0)
                 return static_cast<zv_status>(-EAGAIN);
@@ -152,25 +151,17 @@ ZV_EXPORT zv_status zv_util_read_file(int32_t fd, char **buf_out, uint32_t *size
     if (buf_out == nullptr || size_out == nullptr)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
     struct stat64 st;
-    int result = fd_status(fd, &st);
     // With 64-bit offsets the query takes any size, but the read below counts
     // in 32 bits: refuse what would not fit as a 32-bit platform would.
-    if (result == 0 && st.st_size > kLargestSize) {
-        errno = EOVERFLOW;
-        result = -1;
-    }
-    if (result != 0) {
-        zv::set_errno_out(errno_out, errno);
-        return ZV_FAIL(ZV_ERR_SYSTEM);
-    }
+    if (fd_status(fd, &st) != 0 || past_size_bound(st))
+        return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
     auto size = static_cast<int32_t>(st.st_size);
     *size_out = static_cast<uint32_t>(size);
 
     zv::unique_malloc<char> buffer(static_cast<char *>(std::malloc(static_cast<size_t>(size) + 1)));
     if (!buffer) {
-        zv::set_errno_out(errno_out, errno);
         *buf_out = nullptr;
-        return ZV_FAIL(ZV_ERR_NO_MEMORY);
+        return ZV_ERRNO_FAIL(ZV_ERR_NO_MEMORY, errno_out);
     }
     if (zv_util_whole_read(fd, buffer.get(), size) != size) {
         *buf_out = nullptr;
@@ -189,10 +180,19 @@ ZV_EXPORT zv_status zv_util_count_lines(int32_t fd, uint32_t *count_out, int32_t
         return ZV_FAIL(ZV_ERR_BAD_VALUE);
     off_t start = ::lseek(fd, 0, SEEK_CUR);
     struct stat64 st;
-    if (start == -1 || fd_status(fd, &st) != 0 || ::lseek(fd, 0, SEEK_SET) == -1) {
-        zv::set_errno_out(errno_out, errno);
-        return ZV_FAIL(ZV_ERR_SYSTEM);
-    }
+    if (start == -1 || fd_status(fd, &st) != 0 || ::lseek(fd, 0, SEEK_SET) == -1)
+        return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
+    // Every way out puts the position back where it was.
+    struct Restore {
+        int fd;
+        off_t start;
+        ~Restore()
+        {
+            int saved = errno;
+            ::lseek(fd, start, SEEK_SET);
+            errno = saved;
+        }
+    } restore{fd, start};
 
     *count_out = 0;
     char chunk[1024];
@@ -200,17 +200,13 @@ ZV_EXPORT zv_status zv_util_count_lines(int32_t fd, uint32_t *count_out, int32_t
     for (off64_t consumed = 0; consumed < st.st_size;) {
         auto want = static_cast<size_t>(std::min<off64_t>(sizeof chunk, st.st_size - consumed));
         ssize_t n = ::read(fd, chunk, want);
-        if (n < 0) {
-            zv::set_errno_out(errno_out, errno);
-            ::lseek(fd, start, SEEK_SET);
-            return ZV_FAIL(ZV_ERR_SYSTEM);
-        }
+        if (n < 0)
+            return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
         if (n == 0)
             break;  // the file shrank under us: count what was there
         consumed += n;
         *count_out += count_newlines(chunk, static_cast<size_t>(n));
     }
-    ::lseek(fd, start, SEEK_SET);
     return ZV_OK;
 }
 
@@ -234,10 +230,8 @@ ZV_EXPORT zv_status zv_util_truncate_file(const char *path, int32_t length, int3
 {
     if (path == nullptr)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
-    if (::truncate(path, length) == -1) {
-        zv::set_errno_out(errno_out, errno);
-        return ZV_FAIL(ZV_ERR_SYSTEM);
-    }
+    if (::truncate(path, length) == -1)
+        return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
     return ZV_OK;
 }
 
@@ -245,10 +239,8 @@ ZV_EXPORT zv_status zv_util_delete_file(const char *path, int32_t *errno_out)
 {
     if (path == nullptr)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
-    if (::unlink(path) != 0) {
-        zv::set_errno_out(errno_out, errno);
-        return ZV_FAIL(ZV_ERR_SYSTEM);
-    }
+    if (::unlink(path) != 0)
+        return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
     return ZV_OK;
 }
 

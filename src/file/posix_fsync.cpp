@@ -14,7 +14,7 @@ constexpr size_t kPathLimit = 1000;
 
 }  // namespace
 
-FILE *zv_util_open_stream(const char *path, const char *mode)
+FILE *zv::zv_util_open_stream(const char *path, const char *mode)
 {
     return std::fopen(path, mode);
 }
@@ -49,11 +49,10 @@ ZV_EXPORT zv_status zv_util_sync_file(const char *path)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
     if (strnlen(path, kPathLimit) >= kPathLimit)
         return ZV_FAIL(ZV_ERR_BAD_VALUE);
-    char *text = nullptr;
-    zv_status status = zv_util_get_directory_component(path, &text);
+    zv::unique_malloc<char> directory;
+    zv_status status = zv_util_get_directory_component(path, zv::out_block(directory));
     if (status != ZV_OK)
         return ZV_FAIL_THEN_LOG(status, "Failed to get directory component\n");
-    zv::unique_malloc<char> directory(text);
 
     // Both descriptors are open before either sync; destruction closes the
     // directory's first.

@@ -63,12 +63,11 @@ bool parse_pid(const char *content, uint32_t size, uint32_t *pid)
 // caller to record.
 zv_status examine_holder(const char *path, const char *name, uint32_t *owner_pid)
 {
-    char *raw_content = nullptr;
+    zv::unique_malloc<char> content;
     uint32_t size = 0;
-    zv_status status = zv_util_read_named_file(path, &raw_content, &size, nullptr);
+    zv_status status = zv_util_read_named_file(path, zv::out_block(content), &size, nullptr);
     if (status != ZV_OK)
         return status;
-    zv::unique_malloc<char> content(raw_content);
     if (size == 0)
         return ZV_OK;
     uint32_t name_length = zv_util_strnlen(name, kMaxNameLength + 1);
@@ -77,11 +76,10 @@ zv_status examine_holder(const char *path, const char *name, uint32_t *owner_pid
     uint32_t pid = 0;
     if (!parse_pid(content.get(), size, &pid))
         return ZV_OK;
-    char *raw_cmdline = nullptr;
-    status = map_pid_to_exe(content.get(), &raw_cmdline, name_length + 1);
+    zv::unique_malloc<char> cmdline;
+    status = zv::map_pid_to_exe(content.get(), zv::out_block(cmdline), name_length + 1);
     if (status != ZV_OK)
         return status;
-    zv::unique_malloc<char> cmdline(raw_cmdline);
     // Gone, empty (a zombie), or another program.
     if (!cmdline || std::strncmp(cmdline.get(), name, name_length) != 0)
         return ZV_OK;
@@ -91,26 +89,20 @@ zv_status examine_holder(const char *path, const char *name, uint32_t *owner_pid
 
 }  // namespace
 
+namespace zv {
+
 zv_status map_pid_to_exe(const char *pid_text, char **cmdline_out, uint32_t length)
 {
     *cmdline_out = nullptr;
-    char *raw_path = nullptr;
-    zv_status status = zv_util_asprintf(&raw_path, nullptr, "/proc/%s/cmdline", pid_text);
-    if (status != ZV_OK) {
-        // This lookup records two frames of its own for a failed formatting.
-        (void)ZV_FAIL(status);
-        return ZV_FAIL(status);
-    }
-    zv::unique_malloc<char> path(raw_path);
-    zv::unique_fd fd(open(path.get(), O_RDONLY | O_CLOEXEC));
-    int open_errno = errno;
-    path.reset();
-    if (!fd && open_errno == ENOENT)
+    unique_fd fd;
+    if (zv_status status = open_cmdline(pid_text, fd); status != ZV_OK)
+        return ZV_FAIL_TWICE(status);
+    if (!fd && errno == ENOENT)
         return ZV_OK;  // no such process
     if (!fd)
         return ZV_FAIL(ZV_ERR_SYSTEM);
 
-    zv::unique_malloc<char> cmdline(static_cast<char *>(std::calloc(length + 1u, 1)));
+    unique_malloc<char> cmdline(static_cast<char *>(std::calloc(length + 1u, 1)));
     if (!cmdline)
         return ZV_FAIL(ZV_ERR_NO_MEMORY);
     // A failed or empty read is no failure: the file counts as stale.
@@ -123,7 +115,7 @@ zv_status map_pid_to_exe(const char *pid_text, char **cmdline_out, uint32_t leng
 
 zv_status write_pid_file(const char *path)
 {
-    zv::unique_file stream(std::fopen(path, "we"));
+    unique_file stream(std::fopen(path, "we"));
     if (!stream)
         return ZV_FAIL(ZV_ERR_SYSTEM);
     char digits[16];
@@ -137,6 +129,8 @@ zv_status write_pid_file(const char *path)
         return ZV_FAIL(ZV_ERR_SYSTEM);
     return ZV_OK;
 }
+
+}  // namespace zv
 
 extern "C" {
 
@@ -167,7 +161,7 @@ ZV_EXPORT zv_status zv_util_claim_pid_file(const char *path, const char *name,
     zv_status status = examine_holder(path, name, owner_pid);
     if (status != ZV_OK)
         return ZV_FAIL(status);
-    return write_pid_file(path);
+    return zv::write_pid_file(path);
 }
 
 }  // extern "C"

@@ -8,6 +8,8 @@
 
 #include "internal.h"
 
+namespace zv {
+
 // Looks up the running processes whose command line matches |name| by
 // scanning /proc. |match_mode| 1: the first word of the command line equals
 // |name|; otherwise |name| occurs in it. |*count_out| gets the number of
@@ -48,3 +50,10 @@ ZV_INTERNAL zv_status map_pid_to_exe(const char *pid_text, char **cmdline_out, u
 // Replaces the content of the PID file |path| with the caller's process ID.
 // ZV_ERR_SYSTEM when the file cannot be opened, written, flushed or closed.
 ZV_INTERNAL zv_status write_pid_file(const char *path);
+
+// Opens /proc/<pid_text>/cmdline read-only into |fd|, which stays empty (errno
+// set) when the open fails. The status of the path's formatting, whose
+// failure the formatter has recorded in a frame.
+ZV_INTERNAL zv_status open_cmdline(const char *pid_text, unique_fd &fd);
+
+}  // namespace zv

@@ -14,12 +14,9 @@ ZV_EXPORT zv_status zv_util_get_directory_component(const char *path, char **dir
     // Cut at the last slash; without one the whole path is the answer (not ".").
     const char *slash = std::strrchr(path, '/');
     size_t length = slash != nullptr ? static_cast<size_t>(slash - path) : std::strlen(path);
-    auto *copy = static_cast<char *>(std::malloc(length + 1));
-    *dir_out = copy;
-    if (copy == nullptr)
+    *dir_out = zv::copy_text(path, length);
+    if (*dir_out == nullptr)
         return ZV_FAIL(ZV_ERR_NO_MEMORY);
-    std::memcpy(copy, path, length);
-    copy[length] = '\0';
     return ZV_OK;
 }
 

@@ -76,10 +76,7 @@ ZV_EXPORT void *zv_util_memdup0(const void *source, uint32_t size)
     // The terminator must fit in the 32-bit size as well.
     if (source == nullptr || size == UINT32_MAX)
         return nullptr;
-    void *copy = std::calloc(1, size + 1u);
-    if (copy != nullptr)
-        std::memcpy(copy, source, size);
-    return copy;
+    return zv::copy_text(static_cast<const char *>(source), size);
 }
 
 ZV_EXPORT int32_t zv_util_strcasecmp(const char *first, const char *second)

@@ -1,7 +1,9 @@
 // Formatted allocation: measure, allocate exactly, format.
 #include <zvutil/format.h>
 
-#include "string/format_internal.h"
+#include <cstdio>
+
+#include "internal.h"
 
 extern "C" {
 
@@ -24,10 +26,8 @@ ZV_EXPORT zv_status zv_util_vasprintf(char **out, const char *format, va_list ar
     zv::unique_malloc<char> text(static_cast<char *>(std::malloc(size)));
     if (!text)
         return ZV_FAIL(ZV_ERR_NO_MEMORY);
-    if (zv::format_into(text.get(), size, format, args) == -1) {
-        zv::set_errno_out(errno_out, errno);
-        return ZV_FAIL(ZV_ERR_SYSTEM);
-    }
+    if (std::vsnprintf(text.get(), size, format, args) == -1)
+        return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
     zv::set_errno_out(errno_out, 0);
     *out = text.release();
     return ZV_OK;

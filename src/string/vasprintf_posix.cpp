@@ -1,7 +1,9 @@
-// Measuring formatted text, and the formatting routine the allocator uses.
+// Measuring formatted text.
 #include <zvutil/format.h>
 
-#include "string/format_internal.h"
+#include <cstdio>
+
+#include "internal.h"
 
 extern "C" {
 
@@ -18,12 +20,3 @@ ZV_EXPORT zv_status zv_util_printf_vsize(const char *format, va_list args, uint3
 }
 
 }  // extern "C"
-
-namespace zv {
-
-int format_into(char *buffer, uint32_t size, const char *format, va_list args)
-{
-    return std::vsnprintf(buffer, size, format, args);
-}
-
-}  // namespace zv

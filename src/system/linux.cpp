@@ -125,7 +125,7 @@ ZV_EXPORT int32_t zv_util_tid(void)
 
 }  // extern "C"
 
-zv_status zv_util_proc_stat(zv_proc_stat *ret_proc_stat, int32_t pid)
+zv_status zv::zv_util_proc_stat(zv_proc_stat *ret_proc_stat, int32_t pid)
 {
     char path[32] = "/proc/self/stat";
     if (pid != 0)
@@ -133,7 +133,7 @@ zv_status zv_util_proc_stat(zv_proc_stat *ret_proc_stat, int32_t pid)
     return zv_util_proc_stat(ret_proc_stat, path);
 }
 
-zv_status zv_util_proc_stat(zv_proc_stat *ret_proc_stat, const char *path)
+zv_status zv::zv_util_proc_stat(zv_proc_stat *ret_proc_stat, const char *path)
 {
     if (ret_proc_stat == nullptr)
         return ZV_LOG_FAIL(ZV_ERR_NULL_ARG, "ret_proc_stat is NULL\n");
@@ -142,12 +142,11 @@ zv_status zv_util_proc_stat(zv_proc_stat *ret_proc_stat, const char *path)
     zv::unique_file stream(std::fopen(path, "re"));
     if (!stream)
         return ZV_FAIL(ZV_ERR_OPEN_FAILED);
-    char *raw_line = nullptr;
+    zv::unique_malloc<char> line;
     size_t capacity = 0;
     errno = 0;  // an empty file leaves errno alone: do not report a stale one
-    ssize_t n = getline(&raw_line, &capacity, stream.get());
+    ssize_t n = getline(zv::out_block(line), &capacity, stream.get());
     int saved_errno = errno;
-    zv::unique_malloc<char> line(raw_line);
     stream.reset();
     if (n == -1)
         return ZV_PERROR_FAIL(saved_errno, ZV_ERR_IO, "getline() failed\n");

@@ -53,6 +53,8 @@ struct zv_proc_stat {
     uint64_t delayacct_blkio_ticks;
 };
 
+namespace zv {
+
 // Fills |*ret_proc_stat| from the first 42 fields of the stat line of |pid|
 // (0: the calling process). The command name runs from the first "(" to the
 // last ")", so spaces and parentheses in it shift no later field.
@@ -66,3 +68,5 @@ ZV_INTERNAL zv_status zv_util_proc_stat(zv_proc_stat *ret_proc_stat, int32_t pid
 // The same for the stat line in the file |path|; it records its frames under
 // the same name.
 ZV_INTERNAL zv_status zv_util_proc_stat(zv_proc_stat *ret_proc_stat, const char *path);
+
+}  // namespace zv

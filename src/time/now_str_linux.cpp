@@ -23,16 +23,13 @@ ZV_EXPORT zv_status zv_util_now_str(char *text, uint32_t *text_length, int32_t *
         return ZV_FAIL(ZV_ERR_BAD_VALUE);
 
     time_t now = time(nullptr);
-    if (now == static_cast<time_t>(-1)) {
-        zv::set_errno_out(errno_out, errno);
-        return ZV_FAIL(ZV_ERR_SYSTEM);
-    }
+    if (now == static_cast<time_t>(-1))
+        return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
     // A failed rendering may leave anything in the buffer, even without a
     // terminator: hand back the empty string instead.
     if (ctime_r(&now, text) == nullptr) {
-        zv::set_errno_out(errno_out, errno);
         text[0] = '\0';
-        return ZV_FAIL(ZV_ERR_SYSTEM);
+        return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
     }
 
     uint32_t length = static_cast<uint32_t>(strnlen(text, kCtimeSize));

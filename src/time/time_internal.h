@@ -8,7 +8,7 @@
 
 #include "internal.h"
 
-extern "C" {
+namespace zv {
 
 // zv_util_query_timeout_expired sets |*expired| to 1 when the deadline |*ts|
 // is at or before the current CLOCK_REALTIME reading, to the nanosecond, and
@@ -18,4 +18,4 @@ extern "C" {
 ZV_INTERNAL zv_status zv_util_query_timeout_expired(const struct timespec *ts,
                                                     uint32_t *expired);
 
-}  // extern "C"
+}  // namespace zv

@@ -61,13 +61,15 @@ ZV_EXPORT zv_status zv_util_future_timeout(struct timespec *ts, int32_t val,
         return ZV_LOG_FAIL(ZV_ERR_SYSTEM, "Failed to get current time.\n");
     zv_status status = zv_util_abs_time_offset(ts, val, scale_to_sec);
     if (status != ZV_OK)
-        return ZV_FAIL_THEN_LOG(status, "Overflow detected when trying to set phase timeout %s\n",
-                                "tmp hack");
+        // Fixed text, the same line for either status.
+        return ZV_FAIL_THEN_LOG(status,
+                                "Overflow detected when trying to set phase timeout tmp hack\n");
     return ZV_OK;
 }
 
-ZV_INTERNAL zv_status zv_util_query_timeout_expired(const struct timespec *ts,
-                                                    uint32_t *expired)
+}  // extern "C"
+
+zv_status zv::zv_util_query_timeout_expired(const struct timespec *ts, uint32_t *expired)
 {
     struct timespec now;
     if (clock_gettime(CLOCK_REALTIME, &now) != 0)
@@ -77,6 +79,8 @@ ZV_INTERNAL zv_status zv_util_query_timeout_expired(const struct timespec *ts,
     *expired = ahead ? 0 : 1;
     return ZV_OK;
 }
+
+extern "C" {
 
 ZV_EXPORT zv_status zv_util_cmp_timeout(const struct timespec *first,
                                         const struct timespec *second, int32_t *result)

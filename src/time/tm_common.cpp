@@ -12,12 +12,6 @@ namespace {
 // asctime_r writes 24 characters, a newline and a NUL.
 constexpr uint32_t kAsctimeSize = 26;
 
-// The time of day; false when it cannot be read.
-bool read_time_of_day(struct timeval *tv)
-{
-    return gettimeofday(tv, nullptr) == 0;
-}
-
 }  // namespace
 
 extern "C" {
@@ -58,7 +52,7 @@ ZV_EXPORT struct tm *zv_util_localtime_r(const time_t *when, struct tm *tm_out)
 ZV_EXPORT int64_t zv_util_walltime_msec(void)
 {
     struct timeval tv;
-    if (!read_time_of_day(&tv))
+    if (gettimeofday(&tv, nullptr) != 0)
         return 0;
     return static_cast<int64_t>(tv.tv_sec) * 1000 + tv.tv_usec / 1000;
 }
@@ -66,7 +60,7 @@ ZV_EXPORT int64_t zv_util_walltime_msec(void)
 ZV_EXPORT int64_t zv_util_walltime_usec(void)
 {
     struct timeval tv;
-    if (!read_time_of_day(&tv))
+    if (gettimeofday(&tv, nullptr) != 0)
         return 0;
     return static_cast<int64_t>(tv.tv_sec) * 1000000 + tv.tv_usec;
 }
