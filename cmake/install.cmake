@@ -24,7 +24,7 @@ install(DIRECTORY ${PROJECT_SOURCE_DIR}/include/zvutil
 # at install time is honoured.
 set(ZV_PKGCONFIG_DIR ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
 if(ZV_RELOCATABLE_PKGCONFIG)
-  file(RELATIVE_PATH ZV_PC_TO_PREFIX /root/${ZV_PKGCONFIG_DIR} /root)
+  file(RELATIVE_PATH ZV_PC_TO_PREFIX /${ZV_PKGCONFIG_DIR} /)
   set(ZV_PC_PREFIX "\${pcfiledir}/${ZV_PC_TO_PREFIX}")
 else()
   set(ZV_PC_PREFIX ${CMAKE_INSTALL_PREFIX})

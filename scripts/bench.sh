@@ -14,9 +14,9 @@ for target in $targets; do
     dir=build/bench-$target
     cmake --preset "bench-$target" >/dev/null
     cmake --build --preset "bench-$target" >/dev/null
-    run=() note=""
-    if ! "$dir/benchmarks/zvutil_run_probe" >/dev/null 2>&1; then
-        run=(qemu-i386)
+    runner=$(scripts/i386-runner.sh "$dir/benchmarks/zvutil_run_probe")
+    run=(${runner:+"$runner"}) note=""
+    if [ -n "$runner" ]; then
         note="emulated under qemu-i386: the figures show that the programs run, not the speed"
     fi
     rm -rf "$dir/results" && mkdir -p "$dir/results"

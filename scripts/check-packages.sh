@@ -49,9 +49,8 @@ grep -E '^Setting up' "$work/apt.log"
 dpkg -L libzvutil-dev:$arch | grep -E "/usr/lib/$triplet/(libzvutil\.so$|pkgconfig|cmake/zvutil/zvutilConfig)"
 ls /usr/lib/$triplet/libzvutil.so.1 /usr/lib/$triplet/libzverrortrace.so.1 /usr/lib/$triplet/libzvlog.so.1
 
-run=()
-echo 'int main(void) { return 0; }' | gcc -m32 -x c - -o "$work/probe"
-"$work/probe" 2>/dev/null || run=(qemu-i386)   # this kernel runs no i386 programs itself
+runner=$(scripts/i386-runner.sh)
+run=(${runner:+"$runner"})
 
 step "gcc -m32 \$(pkg-config --cflags --libs zvutil) with the $arch pkg-config files"
 if command -v i686-linux-gnu-pkg-config >/dev/null; then

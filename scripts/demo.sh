@@ -28,9 +28,7 @@ cmake -S examples -B build/demo/cmake -G Ninja --toolchain "$PWD/cmake/i386-linu
 cmake --build build/demo/cmake >/dev/null
 echo "   built build/demo/cmake/demo"
 
-run=()
-if ! build/demo/demo --probe >/dev/null 2>&1; then
-    run=(qemu-i386)   # this kernel runs no i386 programs itself
-fi
+runner=$(scripts/i386-runner.sh build/demo/demo --probe)
+run=(${runner:+"$runner"})
 echo "== running the demo (${run[*]:-natively})"
 "${run[@]}" build/demo/demo
