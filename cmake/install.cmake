@@ -21,14 +21,22 @@ install(DIRECTORY ${PROJECT_SOURCE_DIR}/include/zvutil
   DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT development)
 
 # By default the .pc files find their prefix from where they lie, so --prefix
-# at install time is honoured.
+# at install time is honoured. An absolute libdir or includedir is written as
+# it stands, and a .pc file in an absolute libdir names the install prefix.
 set(ZV_PKGCONFIG_DIR ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
-if(ZV_RELOCATABLE_PKGCONFIG)
+if(ZV_RELOCATABLE_PKGCONFIG AND NOT IS_ABSOLUTE "${CMAKE_INSTALL_LIBDIR}")
   file(RELATIVE_PATH ZV_PC_TO_PREFIX /${ZV_PKGCONFIG_DIR} /)
   set(ZV_PC_PREFIX "\${pcfiledir}/${ZV_PC_TO_PREFIX}")
 else()
   set(ZV_PC_PREFIX ${CMAKE_INSTALL_PREFIX})
 endif()
+foreach(dir LIBDIR INCLUDEDIR)
+  if(IS_ABSOLUTE "${CMAKE_INSTALL_${dir}}")
+    set(ZV_PC_${dir} "${CMAKE_INSTALL_${dir}}")
+  else()
+    set(ZV_PC_${dir} "\${prefix}/${CMAKE_INSTALL_${dir}}")
+  endif()
+endforeach()
 foreach(pc zvutil zverrortrace zvlog)
   configure_file(${PROJECT_SOURCE_DIR}/cmake/${pc}.pc.in ${PROJECT_BINARY_DIR}/${pc}.pc @ONLY)
   install(FILES ${PROJECT_BINARY_DIR}/${pc}.pc DESTINATION ${ZV_PKGCONFIG_DIR}
