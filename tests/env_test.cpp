@@ -24,9 +24,11 @@ TEST(Environment, VariablesAndHostName)
                       zv_util_unsetenv("ZV_EMPTY"), ZV_OK);  // unsetting twice is no failure
         EXPECT_EQ(take(copy), v299) << "the copy outlives the change";
         EXPECT_EQ(take(zv_util_getenv("ZV_299")) + take(zv_util_getenv("ZV_EMPTY")), "short<NULL>");
-        zvt::expect_failures({{"zv_util_setenv", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_setenv("A=B", "")),
-                               nullptr, 1, zvt::kUntouched,
-                               "Failed to set environment variable: Invalid argument"}});
+        zvt::expect_failures({
+            {"zv_util_setenv", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_setenv("A=B", "")), nullptr, 1,
+             zvt::kUntouched, "Failed to set environment variable: Invalid argument"},
+            {"zv_util_unsetenv", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_unsetenv("A=B")), nullptr, 1,
+             zvt::kUntouched, "Failed to unset environment variable: Invalid argument"}});
     });
     char expected[256] = {};
     ASSERT_EQ(gethostname(expected, sizeof expected), 0);

@@ -18,7 +18,7 @@
 namespace {
 
 using zvt::get_file, zvt::put_file;
-constexpr zv_status kSys = ZV_ERR_SYSTEM;
+constexpr zv_status kSys = ZV_ERR_SYSTEM, kMem = ZV_ERR_NO_MEMORY;
 constexpr const char *kAbsent = "/nonexistent/zvt";
 int32_t *const kErr = &zvt::row_errno;
 
@@ -74,6 +74,7 @@ TEST(Files, FailureTable)
     FILE *stream = nullptr;
     char *buf = nullptr;
     uint32_t n = 0;
+    int64_t size = 0;
     // A NULL between two checked pointers fails either || turned into &&.
     for (zv_status status :
          {zv_util_open(nullptr, 0, 0, 0, kAbsent), zv_util_fopen(&stream, 0, nullptr, kAbsent),
@@ -101,7 +102,7 @@ TEST(Files, FailureTable)
         {"zv_util_whole_write", kSys, ZVT_CALL(zv_util_whole_write(-1, "a", 1, kErr)), 0, 1, EBADF},
         {"zv_util_read_file", kSys, ZVT_CALL(read_fd(-1)), 0, 1, EBADF},
         {"zv_util_read_file", kSys, ZVT_CALL(read_fd(huge)), 0, 1, EOVERFLOW},
-        {"zv_util_read_file", ZV_ERR_NO_MEMORY, ZVT_CALL(read_fd(fd)), "alloc", 1, EIO},
+        {"zv_util_read_file", kMem, ZVT_CALL(read_fd(fd)), "alloc", 1, EIO},
         {"zv_util_count_lines", ZV_ERR_BAD_VALUE, ZVT_CALL(zv_util_count_lines(-1, &n, nullptr))},
         {"zv_util_count_lines", kSys, ZVT_CALL(zv_util_count_lines(fd, &n, kErr)), "fstat", 1, EIO},
         {"zv_util_count_lines", kSys, ZVT_CALL(zv_util_count_lines(fd, &n, kErr)), "read", 2, EIO},
@@ -121,8 +122,20 @@ TEST(Files, FailureTable)
         {"zv_util_sync_file", kSys, sync, "open", 2, zvt::kUntouched, "Failed to open directory"},
         {"zv_util_sync_file", kSys, sync, "fsync", 1, zvt::kUntouched, "Failed to sync file"},
         {"zv_util_sync_file", kSys, sync, "fsync", 2, zvt::kUntouched, "Failed to sync directory file"},
-        {"zv_util_get_directory_component,zv_util_sync_file", ZV_ERR_NO_MEMORY, sync, "alloc", 1,
+        {"zv_util_get_directory_component,zv_util_sync_file", kMem, sync, "alloc", 1,
          zvt::kUntouched, "Failed to get directory component", 2},
+        {"zv_util_get_file_size", kSys, ZVT_CALL(zv_util_get_file_size(kAbsent, &size))},
+        {"zv_util_get_file_size", kSys, ZVT_CALL(zv_util_get_file_size(f.c_str(), &size)), "fstat"},
+        {"zv_util_abs_path", kSys, ZVT_CALL(zv_util_abs_path(kAbsent, &buf))},
+        {"zv_util_read_named_file", kSys, ZVT_CALL(read_path(f)), "fopen"},
+        {"zv_util_read_named_file", kMem, ZVT_CALL(read_path(f)), "alloc"},
+        {"zv_util_get_directory_component,zv_util_write_named_file", kMem, write, "alloc"},
+        {"zv_util_write_named_file", kSys, write, "fopen"},
+        {"zv_util_get_file_size,zv_util_read_named_file", kSys,
+         ZVT_CALL(zv_util_copy_file(kAbsent, f.c_str()))},
+        {"zv_util_write_named_file", kSys, ZVT_CALL(zv_util_copy_file(f.c_str(), f_x.c_str()))},
+        {"zv_util_mkdir", kSys, ZVT_CALL(zv_util_mkdir(kAbsent))},
+        {"zv_util_mkdir_read_only", kSys, ZVT_CALL(zv_util_mkdir_read_only(kAbsent))},
         {"zv_util_sync_file", ZV_ERR_BAD_VALUE,  // a path of 1000 bytes
          ZVT_CALL(zv_util_sync_file((f + std::string(999 - f.size(), '/') + "f").c_str()))},
     });
@@ -225,6 +238,7 @@ TEST(Directories, PathsCreateScanQuery)
     EXPECT_EQ(zvt::open_fd_count(), fds);
     // A scan that cannot start is a NULL result alone, with errno kept.
     EXPECT_TRUE(zv_util_dirscan_begin(kAbsent) == nullptr && errno == ENOENT);
+    EXPECT_EQ(zvt::with_fault("alloc", 1, ENOMEM, ZVT_CALL(zv_util_dirscan_begin("/"))), nullptr);
 }
 
 }  // namespace

@@ -7,11 +7,13 @@
 #include <csignal>
 #include <cstring>
 #include <sys/resource.h>
+#include <sys/stat.h>
 
 #include "process/process_internal.h"
 #include "support/process_support.h"
 #include "support/scratch.h"
 #include "system/system_internal.h"
+#include <zvutil/file.h>
 #include <zvutil/process.h>
 
 namespace {
@@ -37,7 +39,10 @@ TEST(PidFile, Claims)
     zvt::ScratchDir dir;
     std::string path = dir / "app.pid", program = "zvt-holder-" + kSelf + "-of-a-long-command-line";
     uint32_t owner = 7;
+    struct stat st;
+    mode_t umask_was = umask(0);  // a new file is readable by all, writable by the group
     EXPECT_EQ(zv_util_claim_pid_file(path.c_str(), "any", &owner), ZV_OK);
+    EXPECT_TRUE(stat(path.c_str(), &st) == 0 && (st.st_mode & 07777) == 0664 && umask(umask_was) == 0);
 
     // The holder's long command line does not fit a block cut too short for it.
     pid_t holder = zvt::start_sleeper(program), ended = zombie();
@@ -93,6 +98,31 @@ TEST(PidFile, Claims)
             {{i < 2 ? looked_up : "", i < 2 ? ZV_ERR_SYSTEM : ZV_OK, over(contents[i]), "open", 4}});
     zvt::stop_child(holder);
     waitpid(ended, nullptr, 0);
+}
+
+TEST(PidFile, OfTwoRacingClaimersOneWins)
+{
+    zvt::ScratchDir dir;
+    std::string path = dir / "race.pid";
+    for (int round = 0; round < 20; round++, unlink(path.c_str())) {
+        int go[2], done[2];
+        ASSERT_EQ(pipe(go) | pipe(done), 0);
+        pid_t claimers[2];
+        for (pid_t &pid : claimers)
+            if ((pid = fork()) == 0) {  // claims when let go, then lives on as the holder
+                uint32_t owner = 0;
+                int32_t result[2] = {getpid()};  // who, and the status
+                close(go[1]), read(go[0], &owner, 1);
+                result[1] = zv_util_claim_pid_file(path.c_str(), "", &owner);
+                write(done[1], result, sizeof result), pause();
+            }
+        int32_t results[4] = {};
+        close(go[0]), close(go[1]), close(done[1]);
+        EXPECT_EQ(zv_util_whole_read(done[0], results, sizeof results), int(sizeof results));
+        zvt::stop_child(claimers[0]), zvt::stop_child(claimers[1]), close(done[0]);
+        EXPECT_EQ((results[1] == ZV_OK) + (results[3] == ZV_OK), 1) << results[1] << results[3];
+        EXPECT_EQ(zvt::get_file(path), std::to_string(results[results[1] == ZV_OK ? 0 : 2]));
+    }
 }
 
 TEST(Spawn, ExitCodesArgumentsEnvironmentSignalStateAndNoProcessLeft)

@@ -63,15 +63,13 @@ TEST(Clock, PinnedReadingsAndFailures)
     Pinned clock({kMax - 5, 623456789});
     timespec ts{}; timeval tv{};
     EXPECT_TRUE(zv_util_future_timeout(&ts, 4500, 1000) == kOk && at(ts) == at({kMax, 123456789}));
-    // A refused deadline keeps the clock reading.
-    EXPECT_TRUE(zv_util_future_timeout(&ts, 6, 1) == kOver && at(ts) == at({kMax - 5, 623456789}));
     EXPECT_TRUE(zv_util_future_time(5, &tv) == kOk && tv.tv_sec == kMax);
     EXPECT_TRUE(zv_util_future_time(6, &tv) == kOver && tv.tv_sec == kMax - 5);
     EXPECT_EQ(zv_util_walltime_msec(), (kMax - 5) * int64_t{1000} + 623);
     EXPECT_EQ(zv_util_walltime_usec(), (kMax - 5) * int64_t{1000000} + 623456);
     EXPECT_EQ(zv_util_timer_point(), (kMax - 5) * uint64_t{1000000000} + 623456789);
 
-    char text[32]; uint32_t length = 26, size = 26, ms;
+    char text[32]; uint32_t length = 26, size = 26;
     EXPECT_TRUE(zv_util_now_str(text, &length, nullptr) == kOk && length == 24);
     EXPECT_STREQ(text, "Tue Jan 19 03:14:02 2038");
     tm now{}, utc{};
@@ -81,23 +79,34 @@ TEST(Clock, PinnedReadingsAndFailures)
     EXPECT_STREQ(text, "Tue Feb 29 00:00:00 2000\n");
     EXPECT_TRUE(zv_util_localtime_r(&when, &now) == &now && now.tm_yday == 59 && now.tm_hour == 0);
 
-    // What only a failure shows: one NULL at a time, a failed clock or
-    // rendering, and the frames and log line of a failed offset.
+    // What only a failure shows: a NULL after a valid pointer, a failed clock
+    // or rendering, and the frames and log lines of a refused deadline.
     int32_t *err = &zvt::row_errno;
+    uint32_t expired = 7;
+    const char *no_clock = "Failed to get current time.";
     zvt::expect_failures({
         ROW(kBad, abs_time_offset, (&ts, 5, 0), .log = "Bad value, val: 5 scale_to_sec: 0"),
-        ROW(kNull, timeval_to_ms, (nullptr, &ms)), ROW(kNull, timeval_to_ms, (&tv, nullptr)),
+        {.frames = "zv_util_abs_time_offset,zv_util_future_timeout", .status = kOver,
+         .call = ZVT_CALL(zv_util_future_timeout(&ts, 6, 1)),
+         .log = "Overflow detected when trying to set phase timeout tmp hack", .log_after = 2},
+        ROW(kSys, future_timeout, (&ts, 1, 1), .point = "clock_gettime", .log = no_clock),
+        ROW(kSys, query_timeout_expired, (&ts, &expired), .point = "clock_gettime"),
+        ROW(kSys, query_timeout_left, (&ts, text, 32), .point = "clock_gettime", .log = no_clock),
+        ROW(kNull, future_time, (5, nullptr)), ROW(kBad, future_time, (-1, &tv)),
+        ROW(kSys, future_time, (5, &tv), .point = "gettimeofday"),
+        {.frames = "", .status = kNull, .call = ZVT_CALL(zv_util_ms_to_timeval(1, nullptr))},
+        ROW(kNull, timeval_to_ms, (&tv, nullptr)), ROW(kNull, asctime, (&now, nullptr, 26)),
+        ROW(kNull, now_str, (text, nullptr, err)),
         ROW(kSys, get_broken_down_time, (&now), .point = "time", .log = "Failed to read time"),
-        ROW(kNull, asctime, (nullptr, text, 26)), ROW(kNull, asctime, (&now, nullptr, 26)),
-        ROW(kNull, now_str, (nullptr, &size, err)), ROW(kNull, now_str, (text, nullptr, err)),
         ROW(kSys, now_str, (text, &size, err), .point = "time", .err = EIO),
         ROW(kSys, now_str, (text, &size, err), .point = "ctime_r", .err = EIO),
         ROW(kSys, asctime, (&now, text, 26), .point = "asctime_r"),
         ROW(kSys, gmtime, (&when, &now), .point = "gmtime_r"),
         ROW(kSys, get_broken_down_time, (&now), .point = "localtime_r", .log = "Failed to unpick time"),
     });
-    // A failed rendering leaves the empty string.
-    EXPECT_TRUE(text[0] == '\0' && zv_util_cmp_timeout(&ts, nullptr, err) == kNull) << text;
+    // A refused deadline keeps the clock reading; a failed rendering leaves the empty string.
+    EXPECT_TRUE(at(ts) == at({kMax - 5, 623456789}) && expired == 7 && text[0] == '\0' &&
+                zv_util_cmp_timeout(&ts, nullptr, err) == kNull) << text;
     // These report a failed reading by their result alone.
     EXPECT_EQ(zvt::with_fault("gettimeofday", 1, EIO, zv_util_walltime_msec), 0);
     EXPECT_EQ(zvt::with_fault("gettimeofday", 1, EIO, zv_util_walltime_usec), 0);
