@@ -27,6 +27,8 @@ TEST(Environment, VariablesAndHostName)
         zvt::expect_failures({
             {"zv_util_setenv", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_setenv("A=B", "")), nullptr, 1,
              zvt::kUntouched, "Failed to set environment variable: Invalid argument"},
+            {"zv_util_setenv", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_setenv(nullptr, ""))},
+            {"zv_util_unsetenv", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_unsetenv(nullptr))},
             {"zv_util_unsetenv", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_unsetenv("A=B")), nullptr, 1,
              zvt::kUntouched, "Failed to unset environment variable: Invalid argument"}});
     });
@@ -44,6 +46,7 @@ TEST(EnsureEgid, SwitchesTheEffectiveGroupOnly)
     ASSERT_EQ(ensure_egid(name.c_str()), ZV_OK);  // nothing changes
     getgrnam("no-such-group");  // the group database keeps what its first lookups allocate
     zvt::expect_failures({
+        {"ensure_egid", ZV_ERR_NULL_ARG, ZVT_CALL(ensure_egid(nullptr))},
         {"ensure_egid", ZV_ERR_BAD_VALUE, ZVT_CALL(ensure_egid(std::string(33, 'g').c_str())),
          "getgrnam_r"},  // refused before any lookup
         {"ensure_egid", ZV_ERR_SYSTEM, ZVT_CALL(ensure_egid(std::string(32, 'g').c_str())), nullptr,

@@ -80,8 +80,14 @@ TEST(Files, FailureTable)
          {zv_util_open(nullptr, 0, 0, 0, kAbsent), zv_util_fopen(&stream, 0, nullptr, kAbsent),
           zv_util_read_file(0, &buf, nullptr, 0), zv_util_read_named_file(kAbsent, nullptr, &n, 0),
           zv_util_query_file_exists(kAbsent, nullptr), zv_util_get_file_size(kAbsent, nullptr),
-          zv_util_write_named_file(kAbsent, 1, nullptr, 0, 0), zv_util_copy_file(kAbsent, nullptr)})
+          zv_util_write_named_file(kAbsent, 1, nullptr, 0, 0), zv_util_copy_file(kAbsent, nullptr),
+          zv_util_whole_write(-1, nullptr, 1, nullptr), zv_util_count_lines(0, nullptr, nullptr),
+          zv_util_truncate_file(nullptr, 0, nullptr), zv_util_delete_file(nullptr, nullptr),
+          zv_util_sync(nullptr, nullptr), zv_util_sync_file(nullptr), zv_util_mkdir(nullptr),
+          zv_util_mkdir_read_only(nullptr), zv_util_dirscan(nullptr),
+          zv_util_query_dir_exists(nullptr, &n)})
         EXPECT_STATUS(ZV_ERR_NULL_ARG, status);
+    EXPECT_TRUE(zv_util_dirscan_begin(nullptr) == nullptr && zv_util_whole_read(-1, &n, 1) == -1);
     zvt::ScratchDir dir;
     std::string f = dir / "f", big = dir / "big", f_x = f + "/x";
     put_file(f, std::string(2000, '\n'));
@@ -99,10 +105,15 @@ TEST(Files, FailureTable)
     zvt::expect_failures({
         {"zv_util_open", kSys, ZVT_CALL(zv_util_open(&out, kErr, 0, 0, kAbsent)), 0, 1, ENOENT},
         {"zv_util_fopen", kSys, ZVT_CALL(zv_util_fopen(&stream, kErr, "r", kAbsent)), 0, 1, ENOENT},
+        {"zv_util_vasprintf", kMem, ZVT_CALL(zv_util_open(&out, kErr, 0, 0, kAbsent)), "alloc"},
+        {"zv_util_vasprintf,zv_util_fopen", kMem, ZVT_CALL(zv_util_fopen(&stream, kErr, "r", "")),
+         "alloc"},
         {"zv_util_whole_write", kSys, ZVT_CALL(zv_util_whole_write(-1, "a", 1, kErr)), 0, 1, EBADF},
+        {"zv_util_whole_write", ZV_ERR_OVERFLOW, ZVT_CALL(zv_util_whole_write(-1, "a", -1, kErr))},
         {"zv_util_read_file", kSys, ZVT_CALL(read_fd(-1)), 0, 1, EBADF},
         {"zv_util_read_file", kSys, ZVT_CALL(read_fd(huge)), 0, 1, EOVERFLOW},
         {"zv_util_read_file", kMem, ZVT_CALL(read_fd(fd)), "alloc", 1, EIO},
+        {"zv_util_read_file", kSys, ZVT_CALL(read_fd(fd)), "read"},
         {"zv_util_count_lines", ZV_ERR_BAD_VALUE, ZVT_CALL(zv_util_count_lines(-1, &n, nullptr))},
         {"zv_util_count_lines", kSys, ZVT_CALL(zv_util_count_lines(fd, &n, kErr)), "fstat", 1, EIO},
         {"zv_util_count_lines", kSys, ZVT_CALL(zv_util_count_lines(fd, &n, kErr)), "read", 2, EIO},
@@ -118,6 +129,8 @@ TEST(Files, FailureTable)
         {"zv_util_write_named_file", kSys, write, "ferror"},
         {"zv_util_sync,zv_util_write_named_file", kSys, write, "fsync"},
         {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, kAbsent))},
+        {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, nullptr)), "fflush"},
+        {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, "/")), "fsync", 2},
         {"zv_util_sync_file", kSys, sync, "open", 1, zvt::kUntouched, "Failed to open file"},
         {"zv_util_sync_file", kSys, sync, "open", 2, zvt::kUntouched, "Failed to open directory"},
         {"zv_util_sync_file", kSys, sync, "fsync", 1, zvt::kUntouched, "Failed to sync file"},

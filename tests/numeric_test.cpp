@@ -93,11 +93,17 @@ TEST(Prng, KnownSequencesFillsAndFailures)
     });
 
     // One NULL at a time.
+    auto fill = [&](State *of, uint32_t length) { return zv_util_prng_fill(of, &next, length); };
     zvt::expect_failures({
         {"zv_util_prng_unpacked", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_prng(&state, nullptr))},
         ROW(ZV_ERR_NULL_ARG, prng_unpacked, (&state.position, nullptr, state.pool, &mixed)),
         ROW(ZV_ERR_NULL_ARG, prng_batch, (&state, nullptr, 1)),
         ROW(ZV_ERR_BAD_VALUE, mix_into_prng, (&state, 7, nullptr)),
+        ROW(ZV_ERR_NULL_ARG, seed_prng, (nullptr, 1, 0)),
+        {"zv_util_prng_unpacked", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_prng(nullptr, &mixed))},
+        ROW(ZV_ERR_NULL_ARG, prng_fill, (&state, nullptr, 3)),
+        {"zv_util_prng_batch,zv_util_prng_fill", ZV_ERR_NULL_ARG, ZVT_CALL(fill(nullptr, 8))},
+        {"zv_util_prng_batch,zv_util_prng_fill", ZV_ERR_NULL_ARG, ZVT_CALL(fill(nullptr, 3))},
         {"", ZV_OK, ZVT_CALL(zv_util_prng_fill(nullptr, nullptr, 0))}});
 }
 
@@ -117,6 +123,7 @@ TEST(Numeric, SumsPowersOfTwoAndOverflow)
     zvt::expect_failures({
         {"", ZV_OK, [&] { zv_status s = zv_util_sum_init(&w, 3); zv_util_sum_free(&w); return s; }},
         ROW(ZV_ERR_BAD_VALUE, sum_init, (&w, 0), .log = "N is zero"),
+        ROW(ZV_ERR_NULL_ARG, sum_init, (nullptr, 1)),
         ROW(ZV_ERR_NO_MEMORY, sum_init, (&w, 4), .point = "alloc", .log = "calloc() failed, N=4")});
 
     for (auto [value, up, down] : std::initializer_list<std::tuple<uint32_t, uint32_t, uint32_t>>{

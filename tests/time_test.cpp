@@ -69,7 +69,7 @@ TEST(Clock, PinnedReadingsAndFailures)
     EXPECT_EQ(zv_util_walltime_usec(), (kMax - 5) * int64_t{1000000} + 623456);
     EXPECT_EQ(zv_util_timer_point(), (kMax - 5) * uint64_t{1000000000} + 623456789);
 
-    char text[32]; uint32_t length = 26, size = 26;
+    char text[32]; uint32_t length = 26, size = 26, ms;
     EXPECT_TRUE(zv_util_now_str(text, &length, nullptr) == kOk && length == 24);
     EXPECT_STREQ(text, "Tue Jan 19 03:14:02 2038");
     tm now{}, utc{};
@@ -96,7 +96,8 @@ TEST(Clock, PinnedReadingsAndFailures)
         ROW(kSys, future_time, (5, &tv), .point = "gettimeofday"),
         {.frames = "", .status = kNull, .call = ZVT_CALL(zv_util_ms_to_timeval(1, nullptr))},
         ROW(kNull, timeval_to_ms, (&tv, nullptr)), ROW(kNull, asctime, (&now, nullptr, 26)),
-        ROW(kNull, now_str, (text, nullptr, err)),
+        ROW(kNull, now_str, (text, nullptr, err)), ROW(kBad, now_str, (text, &(ms = 25), err)),
+        ROW(ZV_ERR_TOO_SMALL, asctime, (&now, text, 25)),
         ROW(kSys, get_broken_down_time, (&now), .point = "time", .log = "Failed to read time"),
         ROW(kSys, now_str, (text, &size, err), .point = "time", .err = EIO),
         ROW(kSys, now_str, (text, &size, err), .point = "ctime_r", .err = EIO),
