@@ -2,7 +2,6 @@
 #include <tuple>
 
 #include "support/scratch.h"
-#include "support/wrap_time.h"
 #include "time/time_internal.h"
 #include <zvutil/timeutil.h>
 

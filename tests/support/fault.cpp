@@ -15,7 +15,6 @@
 #include <sys/stat.h>
 #include <sys/time.h>
 
-#include "support/wrap_time.h"
 
 #if defined(__SANITIZE_ADDRESS__)
 extern "C" size_t __sanitizer_get_current_allocated_bytes(void);
@@ -31,8 +30,8 @@ struct Rule {
     unsigned nth, extra, calls;
     int err;
 } rules[8];
-unsigned rule_count, open_count;
-OpenCall opens[512];  // room for a scan of every /proc entry
+unsigned rule_count;
+char inheritable[256];
 std::optional<timespec> pinned;
 
 bool known(const char *point)
@@ -84,25 +83,14 @@ bool fault_hit(const char *point)
     return false;
 }
 
-void log_open(const char *function, const char *path, int flags, const char *mode)
+void note_open(bool cloexec, const char *what)
 {
-    if (open_count < std::size(opens)) {
-        OpenCall &call = opens[open_count];
-        std::strncpy(call.function, function, sizeof call.function - 1);
-        std::strncpy(call.path, path != nullptr ? path : "", sizeof call.path - 1);
-        std::strncpy(call.mode, mode != nullptr ? mode : "", sizeof call.mode - 1);
-        call.flags = flags;
-    }
-    open_count++;
+    size_t used = std::strlen(inheritable);
+    if (!cloexec)
+        std::snprintf(inheritable + used, sizeof inheritable - used, "%s ", what);
 }
 
-void open_log_clear() { open_count = 0; }
-
-std::vector<OpenCall> open_log()
-{
-    EXPECT_LE(open_count, std::size(opens)) << "the open log overflowed";
-    return {opens, opens + std::min<size_t>(open_count, std::size(opens))};
-}
+std::string inheritable_opens() { return inheritable; }
 
 void pin_clock(std::optional<timespec> now) { pinned = now; }
 
@@ -126,7 +114,7 @@ struct Reset : ::testing::EmptyTestEventListener {
     void OnTestStart(const ::testing::TestInfo &) override
     {
         fault_clear();
-        open_log_clear();
+        inheritable[0] = '\0';
         zv_trace_clear();
     }
 };
@@ -203,11 +191,11 @@ WRAP(asctime_r, char *, (const tm *a, char *b), "asctime_r", nullptr, __real_asc
 // could be handed.
 WRAP(ctime_r, char *, (const time_t *a, char *b), "ctime_r",
      (std::memset(b, '#', 26), nullptr), __real_ctime_r(a, b))
-// The open calls the library makes also go to the open log.
+// The open calls also note what they leave inheritable.
 FILE *__real_fopen(const char *path, const char *mode);
 FILE *__wrap_fopen(const char *path, const char *mode)
 {
-    zvt::log_open("fopen", path, -1, mode);
+    zvt::note_open(std::strchr(mode, 'e') != nullptr, mode);
     return HIT("fopen") ? nullptr : __real_fopen(path, mode);
 }
 
@@ -218,7 +206,9 @@ int __wrap_open(const char *path, int flags, ...)
     va_start(args, flags);
     mode_t mode = __OPEN_NEEDS_MODE(flags) ? va_arg(args, unsigned) : 0;
     va_end(args);
-    zvt::log_open("open", path, flags, "");
+    char text[16];
+    std::snprintf(text, sizeof text, "%d", flags);
+    zvt::note_open(flags & O_CLOEXEC, text);
     return HIT("open") ? -1 : __real_open(path, flags, mode);
 }
 

@@ -7,9 +7,11 @@
 // right after it (with_fault does both).
 #pragma once
 
+#include <ctime>
 #include <functional>
+#include <optional>
+#include <string>
 #include <utility>
-#include <vector>
 
 #include <zvutil/status.h>
 
@@ -44,12 +46,12 @@ bool fault_hit(const char *point);
         return ::zvt::fault_hit(name);                                                    \
     }()
 
-// Every open and fopen call (the two the library's archive makes), recorded by
-// its wrapper without heap use: |flags| are the open flags (-1 for fopen),
-// |mode| is fopen's mode ("" for open). Each test starts with an empty log.
-struct OpenCall { char function[16]; char path[256]; int flags; char mode[8]; };
-void open_log_clear();
-std::vector<OpenCall> open_log();  // calls since the last clear, oldest first
+// The open flags or fopen modes of the open and fopen calls since the test
+// began that a child could inherit (no O_CLOEXEC, no "e"), each and a space.
+std::string inheritable_opens();
+
+// While set, CLOCK_REALTIME, gettimeofday and time all read |now|.
+void pin_clock(std::optional<timespec> now);
 
 // Bytes of heap in use (glibc's count, or the sanitizer allocator's).
 size_t heap_in_use();
