@@ -21,6 +21,7 @@ using zvt::get_file, zvt::put_file;
 constexpr zv_status kSys = ZV_ERR_SYSTEM, kMem = ZV_ERR_NO_MEMORY;
 constexpr const char *kAbsent = "/nonexistent/zvt";
 int32_t *const kErr = &zvt::row_errno;
+using zvt::kUntouched;
 
 int open_read(const std::string &path) { return open(path.c_str(), O_RDONLY | O_LARGEFILE); }
 
@@ -131,12 +132,12 @@ TEST(Files, FailureTable)
         {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, kAbsent))},
         {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, nullptr)), "fflush"},
         {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, "/")), "fsync", 2},
-        {"zv_util_sync_file", kSys, sync, "open", 1, zvt::kUntouched, "Failed to open file"},
-        {"zv_util_sync_file", kSys, sync, "open", 2, zvt::kUntouched, "Failed to open directory"},
-        {"zv_util_sync_file", kSys, sync, "fsync", 1, zvt::kUntouched, "Failed to sync file"},
-        {"zv_util_sync_file", kSys, sync, "fsync", 2, zvt::kUntouched, "Failed to sync directory file"},
+        {"zv_util_sync_file", kSys, sync, "open", 1, kUntouched, "Failed to open file"},
+        {"zv_util_sync_file", kSys, sync, "open", 2, kUntouched, "Failed to open directory"},
+        {"zv_util_sync_file", kSys, sync, "fsync", 1, kUntouched, "Failed to sync file"},
+        {"zv_util_sync_file", kSys, sync, "fsync", 2, kUntouched, "Failed to sync directory file"},
         {"zv_util_get_directory_component,zv_util_sync_file", kMem, sync, "alloc", 1,
-         zvt::kUntouched, "Failed to get directory component", 2},
+         kUntouched, "Failed to get directory component", 2},
         {"zv_util_get_file_size", kSys, ZVT_CALL(zv_util_get_file_size(kAbsent, &size))},
         {"zv_util_get_file_size", kSys, ZVT_CALL(zv_util_get_file_size(f.c_str(), &size)), "fstat"},
         {"zv_util_abs_path", kSys, ZVT_CALL(zv_util_abs_path(kAbsent, &buf))},

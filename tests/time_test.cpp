@@ -102,7 +102,8 @@ TEST(Clock, PinnedReadingsAndFailures)
         ROW(kSys, now_str, (text, &size, err), .point = "ctime_r", .err = EIO),
         ROW(kSys, asctime, (&now, text, 26), .point = "asctime_r"),
         ROW(kSys, gmtime, (&when, &now), .point = "gmtime_r"),
-        ROW(kSys, get_broken_down_time, (&now), .point = "localtime_r", .log = "Failed to unpick time"),
+        ROW(kSys, get_broken_down_time, (&now), .point = "localtime_r",
+            .log = "Failed to unpick time"),
     });
     // A refused deadline keeps the clock reading; a failed rendering leaves the empty string.
     EXPECT_TRUE(at(ts) == at({kMax - 5, 623456789}) && expired == 7 && text[0] == '\0' &&
