@@ -1,9 +1,5 @@
 // The environment, the host name and the effective group.
-#include <gtest/gtest.h>
-
 #include "support/scratch.h"
-#include <zvutil/permissions.h>
-#include <zvutil/system.h>
 
 namespace {
 

@@ -1,19 +1,10 @@
 // Descriptors, named files, durable sync, close-on-exec, path components and directories.
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cstring>
-#include <fcntl.h>
 #include <sys/socket.h>
-#include <sys/stat.h>
 
 #include "process/process_internal.h"
 #include "support/feature_paths.h"
 #include "support/scratch.h"
 #include "system/system_internal.h"
-#include <zvutil/directory.h>
-#include <zvutil/file.h>
-#include <zvutil/process.h>
 
 namespace {
 

@@ -1,8 +1,5 @@
 // Option table parser: matching rules, handlers and failure frames.
-#include <vector>
-
 #include "support/scratch.h"
-#include <zvutil/getopt.h>
 
 namespace {
 

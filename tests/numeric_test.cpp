@@ -1,12 +1,9 @@
 // Hash, generator, running sums, overflow predicates, power-of-two rounding
 // and the processor features behind the vector paths.
-#include <cstring>
 #include <random>
-#include <vector>
 
 #include "support/feature_paths.h"
 #include "support/scratch.h"
-#include <zvutil/zvutil.h>
 
 namespace {
 

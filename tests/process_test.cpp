@@ -1,20 +1,12 @@
 // PID files, spawning and waiting, signal dispositions, the /proc lookups,
 // the bounded child wait and the stat line.
-#include <gtest/gtest.h>
-
-#include <algorithm>
 #include <array>
 #include <csignal>
-#include <cstring>
-#include <fstream>
 #include <sys/resource.h>
-#include <sys/stat.h>
 
 #include "process/process_internal.h"
 #include "support/scratch.h"
 #include "system/system_internal.h"
-#include <zvutil/file.h>
-#include <zvutil/process.h>
 
 namespace {
 

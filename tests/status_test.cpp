@@ -1,8 +1,4 @@
 // The failure convention and the two libraries it reports through.
-#include <gtest/gtest.h>
-
-#include <string>
-
 #include "internal.h"
 #include "support/trace.h"
 

@@ -1,20 +1,12 @@
 // Base64 and hexadecimal text and their output blocks; splitting, joining and
 // appending strings; memory primitives; formatted allocation; wide conversion.
-#include <gtest/gtest.h>
 #include <malloc.h>
 
 #include <clocale>
-#include <cstring>
 #include <random>
 
 #include "support/feature_paths.h"
 #include "support/scratch.h"
-#include <zvutil/base64.h>
-#include <zvutil/convert.h>
-#include <zvutil/format.h>
-#include <zvutil/hex.h>
-#include <zvutil/memory.h>
-#include <zvutil/string_ops.h>
 
 namespace {
 

@@ -3,7 +3,6 @@
 
 #include "support/scratch.h"
 #include "time/time_internal.h"
-#include <zvutil/timeutil.h>
 
 namespace {
 
