@@ -162,7 +162,7 @@ TEST(NamedFiles, WriteAppendReadCopySyncAndCloseOnExec)
         int32_t fd = -1;
         EXPECT_EQ(zv_util_write_named_file(f.c_str(), 1, content.data(), content.size(), nullptr) +
                       zv_util_copy_file(f.c_str(), g.c_str()) +
-                      zv_util_open(&fd, nullptr, O_RDONLY, 0, "%s/%c", dir.path().c_str(), 'g') +
+                      zv_util_open(&fd, nullptr, O_RDONLY, 0, "%s/%c", dir.path.c_str(), 'g') +
                       zv_util_read_file(fd, &whole, &whole_size, nullptr) +
                       zv_util_read_named_file(g.c_str(), &named, &named_size, nullptr), ZV_OK);
         content += '\0';
@@ -171,10 +171,10 @@ TEST(NamedFiles, WriteAppendReadCopySyncAndCloseOnExec)
         std::free(named), std::free(whole), close(fd);
     }
     FILE *stream = nullptr;
-    ASSERT_EQ(zv_util_fopen(&stream, nullptr, "a", "%s/%c", dir.path().c_str(), 'g'), ZV_OK);
+    ASSERT_EQ(zv_util_fopen(&stream, nullptr, "a", "%s/%c", dir.path.c_str(), 'g'), ZV_OK);
     std::fputs("!", stream);
-    std::string longest = dir.path() + std::string(998 - dir.path().size(), '/') + "g";  // 999
-    EXPECT_EQ(zv_util_sync(stream, nullptr) + zv_util_sync(stream, dir.path().c_str()) +
+    std::string longest = dir.path + std::string(998 - dir.path.size(), '/') + "g";  // 999
+    EXPECT_EQ(zv_util_sync(stream, nullptr) + zv_util_sync(stream, dir.path.c_str()) +
                   zv_util_sync_file(longest.c_str()) + std::fclose(stream), ZV_OK);
     EXPECT_EQ(get_file(g), std::string(70000, 'q') + "!");
     uint32_t exists = 0, gone = 1, owner = 0, count = 0, *pids = nullptr;
@@ -216,7 +216,7 @@ TEST(Directories, PathsCreateScanQuery)
                   zv_util_mkdir_read_only((dir / "gamma").c_str()), ZV_OK);
     ASSERT_EQ(stat((dir / "delta").c_str(), &rw) | stat((dir / "gamma").c_str(), &ro), 0);
     EXPECT_EQ((rw.st_mode & 0777) << 12 | (ro.st_mode & 0777), 0700'0500u);
-    zv_util_dirscan_state *scan = zv_util_dirscan_begin(dir.path().c_str());
+    zv_util_dirscan_state *scan = zv_util_dirscan_begin(dir.path.c_str());
     EXPECT_EQ(zv_dirscan_file_name(scan), nullptr) << "no current entry before the first advance";
     std::string names;
     for (char *name; zv_util_dirscan(scan) == ZV_OK; std::free(name))
@@ -226,7 +226,7 @@ TEST(Directories, PathsCreateScanQuery)
     EXPECT_EQ(zv_dirscan_file_name(scan), nullptr) << "no current entry after the end";
     zv_util_dirscan_end(scan);
     size_t heap = zvt::heap_in_use();
-    ASSERT_EQ(zv_util_dirscan(scan = zv_util_dirscan_begin(dir.path().c_str())), ZV_OK);
+    ASSERT_EQ(zv_util_dirscan(scan = zv_util_dirscan_begin(dir.path.c_str())), ZV_OK);
     EXPECT_EQ(zvt::with_fault("alloc", 1, ENOMEM, ZVT_CALL(zv_dirscan_file_name(scan))), nullptr);
     zv_util_dirscan_end(scan);  // ended midway: everything released
     EXPECT_EQ(zvt::heap_in_use(), heap);

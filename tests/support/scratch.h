@@ -23,24 +23,15 @@ namespace zvt {
 inline constexpr uid_t kNobody = 65534;
 inline constexpr gid_t kNogroup = 65534;
 
-// A fresh directory under /tmp, owned by the unprivileged user so a dropped
-// child can work in it; removed with its content at the end.
-class ScratchDir {
-public:
-    ScratchDir() : path_(mkdtemp(std::string("/tmp/zvutil-test-XXXXXX").data()))
-    {
-        [[maybe_unused]] int ignored = chown(path_.c_str(), kNobody, kNogroup);
-    }
+// A fresh directory under /tmp, removed with its content at the end.
+struct ScratchDir {
+    std::string path = mkdtemp(std::string("/tmp/zvutil-test-XXXXXX").data());
     ~ScratchDir()
     {
         std::error_code ignored;
-        std::filesystem::remove_all(path_, ignored);
+        std::filesystem::remove_all(path, ignored);
     }
-    const std::string &path() const { return path_; }
-    std::string operator/(const std::string &name) const { return path_ + "/" + name; }
-
-private:
-    std::string path_;
+    std::string operator/(const std::string &name) const { return path + "/" + name; }
 };
 
 inline void put_file(const std::string &path, const std::string &content)
