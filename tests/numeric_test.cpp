@@ -9,11 +9,6 @@ namespace {
 
 using Words = std::vector<uint64_t>; using State = zv_util_prng_state;
 
-// A failure row of zv_util_<fn> called with |args|: its one frame with |st|,
-// then any other fields of FailureRow by name.
-#define ROW(st, fn, args, ...) zvt::FailureRow{.frames = "zv_util_" #fn, .status = st, \
-    .call = ZVT_CALL(zv_util_##fn args) __VA_OPT__(, ) __VA_ARGS__}
-
 // Lengths around the short forms, the block, the vector lane and the prefetch
 // stride, on every path, at every alignment, ending where the buffer does.
 TEST(Hash64, KnownValuesOnEveryPathAndFeatures)

@@ -16,10 +16,7 @@ using zvt::kUntouched;
 
 // Whether |block| holds |bytes|. At sizes where the allocator leaves no slack
 // this shows a block one byte short without the sanitizer too.
-bool holds(const void *block, size_t bytes)
-{
-    return malloc_usable_size(const_cast<void *>(block)) >= bytes;
-}
+bool holds(void *block, size_t bytes) { return malloc_usable_size(block) >= bytes; }
 
 constexpr char kAlphabet[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
 
@@ -39,26 +36,20 @@ std::string coded(Code code, const std::string &in, size_t pad)
     return result;
 }
 
-std::string encode(const std::string &s, size_t pad = 0)
-{
-    return coded<char>(zv_util_base64_encode, s, pad);
-}
-std::string decode(const std::string &s, size_t pad = 0)
-{
-    return coded<uint8_t>(zv_util_base64_decode, s, pad);
-}
+using Text = const std::string &;
+std::string encode(Text s, size_t pad = 0) { return coded<char>(zv_util_base64_encode, s, pad); }
+std::string decode(Text s, size_t pad = 0) { return coded<uint8_t>(zv_util_base64_decode, s, pad); }
 zv_status print_hex(const char *bytes, uint32_t n, char **out, uint32_t *length)
 {
     *length = 2 * n + 1;  // the NUL too
     return zv_util_sprintf_bytes(bytes, n, out);
 }
-std::string hex(const std::string &s, size_t pad = 0) { return coded<char>(print_hex, s, pad); }
+std::string hex(Text s, size_t pad = 0) { return coded<char>(print_hex, s, pad); }
 
 // Every processor path codes inputs of every length up to 140 and a few longer
 // ones, every other one padded, as the scalar path does; |pick(n)| draws the
 // characters of the input of length n.
-void expect_paths_agree(std::string (*code)(const std::string &, size_t),
-                        const std::function<char(size_t)> &pick)
+void expect_paths_agree(std::string (*code)(Text, size_t), const std::function<char(size_t)> &pick)
 {
     std::vector<std::string> ins, scalar;
     for (size_t n = 0; n < 1100; n += n < 140 ? 1 : 239)

@@ -51,11 +51,6 @@ TEST(Deadline, OffsetExpiryOrderAndTimeLeft)
     }
 }
 
-// A failure row of zv_util_<fn> called with |args|: its one frame with |st|,
-// then any other fields of FailureRow by name.
-#define ROW(st, fn, args, ...) zvt::FailureRow{.frames = "zv_util_" #fn, .status = st, \
-    .call = ZVT_CALL(zv_util_##fn args) __VA_OPT__(, ) __VA_ARGS__}
-
 TEST(Clock, PinnedReadingsAndFailures)
 {
     Pinned clock({kMax - 5, 623456789});

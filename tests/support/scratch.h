@@ -66,6 +66,10 @@ inline void in_child(bool drop, const std::function<void()> &body)
 
 // A failure row's call.
 #define ZVT_CALL(...) [&] { return __VA_ARGS__; }
+// A failure row of zv_util_<fn> called with |args|: its one frame with |st|,
+// then any other fields of FailureRow by name.
+#define ROW(st, fn, args, ...) zvt::FailureRow{.frames = "zv_util_" #fn, .status = st, \
+    .call = ZVT_CALL(zv_util_##fn args) __VA_OPT__(, ) __VA_ARGS__}
 
 // errno_out target of the failure rows, reset before each row.
 inline constexpr int32_t kUntouched = 12345;
