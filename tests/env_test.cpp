@@ -1,5 +1,5 @@
 // The environment, the host name and the effective group.
-#include "support/scratch.h"
+#include "support/zvt.h"
 
 namespace {
 

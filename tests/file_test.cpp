@@ -2,8 +2,7 @@
 #include <sys/socket.h>
 
 #include "process/process_internal.h"
-#include "support/feature_paths.h"
-#include "support/scratch.h"
+#include "support/zvt.h"
 #include "system/system_internal.h"
 
 namespace {

@@ -1,5 +1,5 @@
 // Option table parser: matching rules, handlers and failure frames.
-#include "support/scratch.h"
+#include "support/zvt.h"
 
 namespace {
 

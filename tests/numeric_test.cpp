@@ -2,8 +2,7 @@
 // and the processor features behind the vector paths.
 #include <random>
 
-#include "support/feature_paths.h"
-#include "support/scratch.h"
+#include "support/zvt.h"
 
 namespace {
 

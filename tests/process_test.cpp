@@ -5,7 +5,7 @@
 #include <sys/resource.h>
 
 #include "process/process_internal.h"
-#include "support/scratch.h"
+#include "support/zvt.h"
 #include "system/system_internal.h"
 
 namespace {

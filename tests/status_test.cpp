@@ -1,6 +1,6 @@
 // The failure convention and the two libraries it reports through.
 #include "internal.h"
-#include "support/trace.h"
+#include "support/zvt.h"
 
 namespace {
 

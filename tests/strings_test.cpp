@@ -5,8 +5,7 @@
 #include <clocale>
 #include <random>
 
-#include "support/feature_paths.h"
-#include "support/scratch.h"
+#include "support/zvt.h"
 
 namespace {
 

@@ -1,7 +1,7 @@
 // Deadlines, time values, calendar time, wall clock and timers.
 #include <tuple>
 
-#include "support/scratch.h"
+#include "support/zvt.h"
 #include "time/time_internal.h"
 
 namespace {
@@ -57,6 +57,7 @@ TEST(Clock, PinnedReadingsAndFailures)
     timespec ts{}; timeval tv{};
     EXPECT_TRUE(zv_util_future_timeout(&ts, 4500, 1000) == kOk && at(ts) == at({kMax, 123456789}));
     EXPECT_TRUE(zv_util_future_time(5, &tv) == kOk && tv.tv_sec == kMax);
+    EXPECT_TRUE(zv_util_future_time(0, &tv) == kOk && tv.tv_sec == kMax - 5);
     EXPECT_TRUE(zv_util_future_time(6, &tv) == kOver && tv.tv_sec == kMax - 5);
     EXPECT_EQ(zv_util_walltime_msec(), (kMax - 5) * int64_t{1000} + 623);
     EXPECT_EQ(zv_util_walltime_usec(), (kMax - 5) * int64_t{1000000} + 623456);

@@ -1,20 +1,12 @@
-#include "support/fault.h"
-
-#include <gtest/gtest.h>
-#include <zverrortrace.h>
+// Fault points, the wrappers that serve them, and the heap and descriptor counts.
+#include "support/zvt.h"
 
 #include <cstdarg>
-#include <cstring>
 #include <cwchar>
 #include <dirent.h>
-#include <fcntl.h>
-#include <filesystem>
-#include <grp.h>
 #include <malloc.h>
 #include <signal.h>
-#include <sys/stat.h>
 #include <sys/time.h>
-
 
 #if defined(__SANITIZE_ADDRESS__)
 extern "C" size_t __sanitizer_get_current_allocated_bytes(void);
