@@ -35,7 +35,7 @@ std::string coded(Code code, const std::string &in, size_t pad)
     return result;
 }
 
-using Text = const std::string &;
+using zvt::Text;
 std::string encode(Text s, size_t pad = 0) { return coded<char>(zv_util_base64_encode, s, pad); }
 std::string decode(Text s, size_t pad = 0) { return coded<uint8_t>(zv_util_base64_decode, s, pad); }
 zv_status print_hex(const char *bytes, uint32_t n, char **out, uint32_t *length)

@@ -115,7 +115,6 @@ class LogCapture {
 public:
     LogCapture() { zv_log_set_sink(sink, this); }
     ~LogCapture() { zv_log_set_sink(nullptr, nullptr); }
-    LogCapture(const LogCapture &) = delete;
 
     // "level/mask/frames message" per line, where frames counts the trace
     // frames already recorded when the line was written.
@@ -150,20 +149,15 @@ inline constexpr gid_t kNogroup = 65534;
 // A fresh directory under /tmp, removed with its content at the end.
 struct ScratchDir {
     std::string path = mkdtemp(std::string("/tmp/zvutil-test-XXXXXX").data());
-    ~ScratchDir()
-    {
-        std::error_code ignored;
-        std::filesystem::remove_all(path, ignored);
-    }
+    std::error_code ignored;
+    ~ScratchDir() { std::filesystem::remove_all(path, ignored); }
     std::string operator/(const std::string &name) const { return path + "/" + name; }
 };
 
-inline void put_file(const std::string &path, const std::string &content)
-{
-    std::ofstream(path, std::ios::binary) << content;
-}
+using Text = const std::string &;
+inline void put_file(Text path, Text content) { std::ofstream(path, std::ios::binary) << content; }
 
-inline std::string get_file(const std::string &path)
+inline std::string get_file(Text path)
 {
     return {std::istreambuf_iterator<char>(std::ifstream(path, std::ios::binary).rdbuf()), {}};
 }
