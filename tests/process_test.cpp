@@ -106,8 +106,7 @@ TEST(PidFile, Claims)
     for (int i = 0; i < 7; i++)
         zvt::expect_failures(
             {{i < 2 ? looked_up : "", i < 2 ? kSys : ZV_OK, over(texts[i]), "open", 4}});
-    stop_child(holder);
-    waitpid(ended, nullptr, 0);
+    stop_child(holder), waitpid(ended, nullptr, 0);
 }
 
 TEST(PidFile, OfTwoRacingClaimersOneWins)
@@ -214,8 +213,7 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
              "Failed to wait for child"},
         });
         EXPECT_TRUE(handle != nullptr && code == 7 && none == nullptr) << "a failed wait keeps it";
-        zv_free_proc_handle(&handle);
-        zv_free_proc_handle(nullptr);
+        zv_free_proc_handle(&handle), zv_free_proc_handle(nullptr);
         EXPECT_EQ(handle, nullptr);
     });
 }
@@ -251,9 +249,7 @@ TEST(PidOf, MatchModesOrderFilterAndFailures)
     std::vector<uint32_t> exact = lookup("", 1), all = lookup("", 0);
     EXPECT_TRUE(has(exact, ended) && !has(exact, first));
     EXPECT_TRUE(has(all, ended) && has(all, first) && has(all, 1));
-    waitpid(ended, nullptr, 0);
-    stop_child(first);
-    stop_child(second);
+    waitpid(ended, nullptr, 0), stop_child(first), stop_child(second);
 
     zvt::LogCapture log;
     zvt::fault_arm("open", 1, EACCES, ~0u);  // no command line opens: nothing qualifies
