@@ -118,6 +118,7 @@ TEST(Files, FailureTable)
         // The file ends before its measured size.
         {"zv_util_read_named_file", kSys, ZVT_CALL(read_path(f)), "fstat_grown"},
         {"zv_util_write_named_file", kSys, write, "ferror"},
+        {"zv_util_write_named_file", kSys, write, "fwrite_idle"},
         {"zv_util_sync,zv_util_write_named_file", kSys, write, "fsync"},
         {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, kAbsent))},
         {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, nullptr)), "fflush"},
@@ -227,7 +228,7 @@ TEST(Directories, PathsCreateScanQuery)
     size_t heap = zvt::heap_in_use();
     ASSERT_EQ(zv_util_dirscan(scan = zv_util_dirscan_begin(dir.path.c_str())), ZV_OK);
     EXPECT_EQ(zvt::with_fault("alloc", 1, ENOMEM, ZVT_CALL(zv_dirscan_file_name(scan))), nullptr);
-    zv_util_dirscan_end(scan);  // ended midway: everything released
+    zv_util_dirscan_end(scan), zv_util_dirscan_end(nullptr);  // ended midway: all released
     EXPECT_EQ(zvt::heap_in_use(), heap);
     unsigned fds = zvt::open_fd_count();
     uint32_t found[3] = {9, 9, 9};

@@ -51,6 +51,7 @@ TEST(Getopt, FormsHandlersAndFailures)
         int_r{0, "", zv_util_getopt_int, &number, 1}, set{0, "", zv_util_getopt_flag, &number, 0};
     zvt::expect_failures({
         {str.c_str(), bad, ZVT_CALL(parse({"prog", "-o", k301.c_str()}))},
+        {str.c_str(), bad, ZVT_CALL(parse({"prog", "-o", "a", "/o", "b"}))},  // given twice
         {str.c_str(), ZV_ERR_NO_MEMORY, ZVT_CALL(parse({"prog", "-o", "a"})), "alloc"},
         {num.c_str(), bad, ZVT_CALL(parse({"prog", "-n", k301.c_str()}))},
         {num.c_str(), bad, ZVT_CALL(parse({"prog", "-n", "-2147483649"}))},
