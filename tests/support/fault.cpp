@@ -58,14 +58,6 @@ void fault_arm(const char *point, unsigned nth, int err, unsigned count)
 
 void fault_clear() { rule_count = 0; }
 
-unsigned fault_calls(const char *point)
-{
-    for (unsigned i = 0; known(point) && i < rule_count; i++)
-        if (std::strcmp(rules[i].point, point) == 0)
-            return rules[i].calls;
-    return 0;
-}
-
 bool fault_hit(const char *point)
 {
     for (Rule *r = rules; r != rules + rule_count; r++)

@@ -54,8 +54,6 @@ inline constexpr const char *kNoFault = "none";
 // |count| further calls fail after it (0: only that one; ~0u: all later ones).
 void fault_arm(const char *point, unsigned nth, int err, unsigned count = 0);
 void fault_clear();
-// Calls seen at |point| since it was armed.
-unsigned fault_calls(const char *point);
 
 template <class F>
 auto with_fault(const char *point, unsigned nth, int err, F &&call)
