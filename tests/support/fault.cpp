@@ -84,7 +84,7 @@ unsigned open_fd_count()
     return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
 }
 
-// Every test starts with an empty trace and open log and no armed fault.
+// Every test starts with an empty trace, no noted opens and no armed fault.
 struct Reset : ::testing::EmptyTestEventListener {
     void OnTestStart(const ::testing::TestInfo &) override
     {
