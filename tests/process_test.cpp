@@ -87,7 +87,7 @@ TEST(PidFile, Claims)
         {claim, kSys, ZVT_CALL(zv_util_claim_pid_file("/none/app.pid", "n", &owner)), nullptr, 1,
          kUntouched, "Cannot access pid file /none/app.pid (No such file or directory)"},
         {claim, ZV_ERR_ACCESS, [&] { zvt::fault_arm("open", 1, EACCES); return over(kSelf)(); }},
-        {claim, kSys, over(kSelf), "open", 2, kUntouched, 
+        {claim, kSys, over(kSelf), "open", 2, kUntouched,
          "Failed to open pid file " + path + " errno 5"},
         {claim, kSys, over(kSelf), "flock", 1, kUntouched, "Failed to lock PID file"},
         {"zv_util_read_named_file,zv_util_claim_pid_file", kSys, over(kSelf), "fopen", 1},
