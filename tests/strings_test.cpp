@@ -196,7 +196,7 @@ TEST(Strings, FailureTable)
                *wchar = "zv_util_char_to_wchar", *scan = "zv_util_sscanf_bytes",
                *print = "zv_util_sprintf_bytes", *splits = "zv_util_split";
     char null_log[128];  // a NULL between checked pointers fails either || turned into &&
-    std::snprintf(null_log, sizeof null_log, "NULL argument detected: %p (nil) %p %p", "a",
+    std::snprintf(null_log, sizeof null_log, "NULL argument detected: %p (nil) %p %p", log,
                   static_cast<void *>(&fields), static_cast<void *>(&n));
     zvt::expect_failures({
         // Text beyond 32 bits is refused; the longest that fits is allocated.
@@ -214,7 +214,7 @@ TEST(Strings, FailureTable)
          kUntouched, log},
         {"zv_util_fprintf_bytes", kNull, ZVT_CALL(zv_util_fprintf_bytes(stdout, nullptr, 0))},
         {"zv_util_printf_bytes", kNull, ZVT_CALL(zv_util_printf_bytes(nullptr, 1))},
-        {splits, kNull, ZVT_CALL(zv_util_split("a", nullptr, &fields, &n)), 0, 1, kUntouched,
+        {splits, kNull, ZVT_CALL(zv_util_split(log, nullptr, &fields, &n)), 0, 1, kUntouched,
          null_log},
         {splits, kBad, ZVT_CALL(zv_util_split("a", "", &fields, &n))},
         // The array comes first, then one block per field.
