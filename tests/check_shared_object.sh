@@ -13,7 +13,8 @@ fail=0
 case $mode in
 exports)
     list=$3 headers=$4
-    exported=$(nm -D --defined-only "$so" | awk '$2 ~ /^[A-Za-z]$/ {print $3}' | sed 's/@.*//' | sort -u)
+    exported=$(nm -D --defined-only "$so" | awk '$2 ~ /^[A-Za-z]$/ {print $3}' | sed 's/@.*//' |
+        sort -u)
     extra=$(comm -23 <(echo "$exported") <(sort -u "$list"))
     if [ -n "$extra" ]; then echo "exported but not public:"; echo "$extra"; fail=1; fi
     declared=$(grep -ohwE "$(paste -sd'|' "$list")" "$headers"/*.h | sort -u)

@@ -1,11 +1,9 @@
 // The environment, the host name and the effective group.
-#include <gtest/gtest.h>
-
-#include "support/scratch.h"
-#include <zvutil/permissions.h>
-#include <zvutil/system.h>
+#include "support/zvt.h"
 
 namespace {
+
+using zvt::kUntouched;
 
 std::string take(char *text)  // a copy of |text|, which is freed; "<NULL>" for none
 {
@@ -24,9 +22,13 @@ TEST(Environment, VariablesAndHostName)
                       zv_util_unsetenv("ZV_EMPTY"), ZV_OK);  // unsetting twice is no failure
         EXPECT_EQ(take(copy), v299) << "the copy outlives the change";
         EXPECT_EQ(take(zv_util_getenv("ZV_299")) + take(zv_util_getenv("ZV_EMPTY")), "short<NULL>");
-        zvt::expect_failures({{"zv_util_setenv", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_setenv("A=B", "")),
-                               nullptr, 1, zvt::kUntouched,
-                               "Failed to set environment variable: Invalid argument"}});
+        zvt::expect_failures({
+            {"zv_util_setenv", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_setenv("A=B", "")), nullptr, 1,
+             kUntouched, "Failed to set environment variable: Invalid argument"},
+            {"zv_util_setenv", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_setenv(nullptr, ""))},
+            {"zv_util_unsetenv", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_unsetenv(nullptr))},
+            {"zv_util_unsetenv", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_unsetenv("A=B")), nullptr, 1,
+             kUntouched, "Failed to unset environment variable: Invalid argument"}});
     });
     char expected[256] = {};
     ASSERT_EQ(gethostname(expected, sizeof expected), 0);
@@ -41,19 +43,23 @@ TEST(EnsureEgid, SwitchesTheEffectiveGroupOnly)
     const std::string name = getgrgid(own)->gr_name, nogroup = getgrgid(zvt::kNogroup)->gr_name;
     ASSERT_EQ(ensure_egid(name.c_str()), ZV_OK);  // nothing changes
     getgrnam("no-such-group");  // the group database keeps what its first lookups allocate
+    auto as = [](std::string group) -> std::function<zv_status()> {
+        return [=] { return ensure_egid(group.c_str()); };
+    };
+    const char *fn = "ensure_egid";
+    const zv_status kSys = ZV_ERR_SYSTEM;
     zvt::expect_failures({
-        {"ensure_egid", ZV_ERR_BAD_VALUE, ZVT_CALL(ensure_egid(std::string(33, 'g').c_str())),
-         "getgrnam_r"},  // refused before any lookup
-        {"ensure_egid", ZV_ERR_SYSTEM, ZVT_CALL(ensure_egid(std::string(32, 'g').c_str())), nullptr,
-         1, zvt::kUntouched, "Failed to query group data"},  // looked up: no such group
-        {"ensure_egid", ZV_ERR_SYSTEM, ZVT_CALL(ensure_egid(name.c_str())), "setegid", 1,
-         zvt::kUntouched, "Failed to update effective gid: Input/output error"},
-        {"ensure_egid", ZV_ERR_SYSTEM, ZVT_CALL(ensure_egid(name.c_str())), "sysconf", 1,
-         zvt::kUntouched, "Failed to query size: Input/output error"},
-        {"ensure_egid", ZV_ERR_NO_MEMORY, ZVT_CALL(ensure_egid(name.c_str())), "alloc", 1, zvt::kUntouched,
+        {fn, ZV_ERR_NULL_ARG, ZVT_CALL(ensure_egid(nullptr))},
+        {fn, ZV_ERR_BAD_VALUE, as(std::string(33, 'g')), "getgrnam_r"},  // before any lookup
+        // Looked up: no such group.
+        {fn, kSys, as(std::string(32, 'g')), nullptr, 1, kUntouched, "Failed to query group data"},
+        {fn, kSys, as(name), "setegid", 1, kUntouched,
+         "Failed to update effective gid: Input/output error"},
+        {fn, kSys, as(name), "sysconf", 1, kUntouched, "Failed to query size: Input/output error"},
+        {fn, ZV_ERR_NO_MEMORY, as(name), "alloc", 1, kUntouched,
          "Failed to allocate " + std::to_string(sysconf(_SC_GETGR_R_SIZE_MAX)) + " byte buffer"},
-        {"ensure_egid", ZV_ERR_SYSTEM, ZVT_CALL(ensure_egid(name.c_str())), "getgrnam_r", 1,
-         zvt::kUntouched, "Failed to query group data: Input/output error"},
+        {fn, kSys, as(name), "getgrnam_r", 1, kUntouched,
+         "Failed to query group data: Input/output error"},
     });
     EXPECT_EQ(getegid(), own);
     if (geteuid() == 0)

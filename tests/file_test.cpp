@@ -1,26 +1,17 @@
 // Descriptors, named files, durable sync, close-on-exec, path components and directories.
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <cstring>
-#include <fcntl.h>
 #include <sys/socket.h>
-#include <sys/stat.h>
 
 #include "process/process_internal.h"
-#include "support/feature_paths.h"
-#include "support/scratch.h"
+#include "support/zvt.h"
 #include "system/system_internal.h"
-#include <zvutil/directory.h>
-#include <zvutil/file.h>
-#include <zvutil/process.h>
 
 namespace {
 
 using zvt::get_file, zvt::put_file;
-constexpr zv_status kSys = ZV_ERR_SYSTEM;
+constexpr zv_status kSys = ZV_ERR_SYSTEM, kMem = ZV_ERR_NO_MEMORY;
 constexpr const char *kAbsent = "/nonexistent/zvt";
 int32_t *const kErr = &zvt::row_errno;
+using zvt::kUntouched;
 
 int open_read(const std::string &path) { return open(path.c_str(), O_RDONLY | O_LARGEFILE); }
 
@@ -74,13 +65,20 @@ TEST(Files, FailureTable)
     FILE *stream = nullptr;
     char *buf = nullptr;
     uint32_t n = 0;
+    int64_t size = 0;
     // A NULL between two checked pointers fails either || turned into &&.
     for (zv_status status :
          {zv_util_open(nullptr, 0, 0, 0, kAbsent), zv_util_fopen(&stream, 0, nullptr, kAbsent),
           zv_util_read_file(0, &buf, nullptr, 0), zv_util_read_named_file(kAbsent, nullptr, &n, 0),
           zv_util_query_file_exists(kAbsent, nullptr), zv_util_get_file_size(kAbsent, nullptr),
-          zv_util_write_named_file(kAbsent, 1, nullptr, 0, 0), zv_util_copy_file(kAbsent, nullptr)})
+          zv_util_write_named_file(kAbsent, 1, nullptr, 0, 0), zv_util_copy_file(kAbsent, nullptr),
+          zv_util_whole_write(-1, nullptr, 1, nullptr), zv_util_count_lines(0, nullptr, nullptr),
+          zv_util_truncate_file(nullptr, 0, nullptr), zv_util_delete_file(nullptr, nullptr),
+          zv_util_sync(nullptr, nullptr), zv_util_sync_file(nullptr), zv_util_mkdir(nullptr),
+          zv_util_mkdir_read_only(nullptr), zv_util_dirscan(nullptr),
+          zv_util_query_dir_exists(nullptr, &n)})
         EXPECT_STATUS(ZV_ERR_NULL_ARG, status);
+    EXPECT_TRUE(zv_util_dirscan_begin(nullptr) == nullptr && zv_util_whole_read(-1, &n, 1) == -1);
     zvt::ScratchDir dir;
     std::string f = dir / "f", big = dir / "big", f_x = f + "/x";
     put_file(f, std::string(2000, '\n'));
@@ -98,10 +96,15 @@ TEST(Files, FailureTable)
     zvt::expect_failures({
         {"zv_util_open", kSys, ZVT_CALL(zv_util_open(&out, kErr, 0, 0, kAbsent)), 0, 1, ENOENT},
         {"zv_util_fopen", kSys, ZVT_CALL(zv_util_fopen(&stream, kErr, "r", kAbsent)), 0, 1, ENOENT},
+        {"zv_util_vasprintf", kMem, ZVT_CALL(zv_util_open(&out, kErr, 0, 0, kAbsent)), "alloc"},
+        {"zv_util_vasprintf,zv_util_fopen", kMem, ZVT_CALL(zv_util_fopen(&stream, kErr, "r", "")),
+         "alloc"},
         {"zv_util_whole_write", kSys, ZVT_CALL(zv_util_whole_write(-1, "a", 1, kErr)), 0, 1, EBADF},
+        {"zv_util_whole_write", ZV_ERR_OVERFLOW, ZVT_CALL(zv_util_whole_write(-1, "a", -1, kErr))},
         {"zv_util_read_file", kSys, ZVT_CALL(read_fd(-1)), 0, 1, EBADF},
         {"zv_util_read_file", kSys, ZVT_CALL(read_fd(huge)), 0, 1, EOVERFLOW},
-        {"zv_util_read_file", ZV_ERR_NO_MEMORY, ZVT_CALL(read_fd(fd)), "alloc", 1, EIO},
+        {"zv_util_read_file", kMem, ZVT_CALL(read_fd(fd)), "alloc", 1, EIO},
+        {"zv_util_read_file", kSys, ZVT_CALL(read_fd(fd)), "read"},
         {"zv_util_count_lines", ZV_ERR_BAD_VALUE, ZVT_CALL(zv_util_count_lines(-1, &n, nullptr))},
         {"zv_util_count_lines", kSys, ZVT_CALL(zv_util_count_lines(fd, &n, kErr)), "fstat", 1, EIO},
         {"zv_util_count_lines", kSys, ZVT_CALL(zv_util_count_lines(fd, &n, kErr)), "read", 2, EIO},
@@ -115,14 +118,29 @@ TEST(Files, FailureTable)
         // The file ends before its measured size.
         {"zv_util_read_named_file", kSys, ZVT_CALL(read_path(f)), "fstat_grown"},
         {"zv_util_write_named_file", kSys, write, "ferror"},
+        {"zv_util_write_named_file", kSys, write, "fwrite_idle"},
         {"zv_util_sync,zv_util_write_named_file", kSys, write, "fsync"},
         {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, kAbsent))},
-        {"zv_util_sync_file", kSys, sync, "open", 1, zvt::kUntouched, "Failed to open file"},
-        {"zv_util_sync_file", kSys, sync, "open", 2, zvt::kUntouched, "Failed to open directory"},
-        {"zv_util_sync_file", kSys, sync, "fsync", 1, zvt::kUntouched, "Failed to sync file"},
-        {"zv_util_sync_file", kSys, sync, "fsync", 2, zvt::kUntouched, "Failed to sync directory file"},
-        {"zv_util_get_directory_component,zv_util_sync_file", ZV_ERR_NO_MEMORY, sync, "alloc", 1,
-         zvt::kUntouched, "Failed to get directory component", 2},
+        {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, nullptr)), "fflush"},
+        {"zv_util_sync", kSys, ZVT_CALL(zv_util_sync(stream, "/")), "fsync", 2},
+        {"zv_util_sync_file", kSys, sync, "open", 1, kUntouched, "Failed to open file"},
+        {"zv_util_sync_file", kSys, sync, "open", 2, kUntouched, "Failed to open directory"},
+        {"zv_util_sync_file", kSys, sync, "fsync", 1, kUntouched, "Failed to sync file"},
+        {"zv_util_sync_file", kSys, sync, "fsync", 2, kUntouched, "Failed to sync directory file"},
+        {"zv_util_get_directory_component,zv_util_sync_file", kMem, sync, "alloc", 1,
+         kUntouched, "Failed to get directory component", 2},
+        {"zv_util_get_file_size", kSys, ZVT_CALL(zv_util_get_file_size(kAbsent, &size))},
+        {"zv_util_get_file_size", kSys, ZVT_CALL(zv_util_get_file_size(f.c_str(), &size)), "fstat"},
+        {"zv_util_abs_path", kSys, ZVT_CALL(zv_util_abs_path(kAbsent, &buf))},
+        {"zv_util_read_named_file", kSys, ZVT_CALL(read_path(f)), "fopen"},
+        {"zv_util_read_named_file", kMem, ZVT_CALL(read_path(f)), "alloc"},
+        {"zv_util_get_directory_component,zv_util_write_named_file", kMem, write, "alloc"},
+        {"zv_util_write_named_file", kSys, write, "fopen"},
+        {"zv_util_get_file_size,zv_util_read_named_file", kSys,
+         ZVT_CALL(zv_util_copy_file(kAbsent, f.c_str()))},
+        {"zv_util_write_named_file", kSys, ZVT_CALL(zv_util_copy_file(f.c_str(), f_x.c_str()))},
+        {"zv_util_mkdir", kSys, ZVT_CALL(zv_util_mkdir(kAbsent))},
+        {"zv_util_mkdir_read_only", kSys, ZVT_CALL(zv_util_mkdir_read_only(kAbsent))},
         {"zv_util_sync_file", ZV_ERR_BAD_VALUE,  // a path of 1000 bytes
          ZVT_CALL(zv_util_sync_file((f + std::string(999 - f.size(), '/') + "f").c_str()))},
     });
@@ -144,7 +162,7 @@ TEST(NamedFiles, WriteAppendReadCopySyncAndCloseOnExec)
         int32_t fd = -1;
         EXPECT_EQ(zv_util_write_named_file(f.c_str(), 1, content.data(), content.size(), nullptr) +
                       zv_util_copy_file(f.c_str(), g.c_str()) +
-                      zv_util_open(&fd, nullptr, O_RDONLY, 0, "%s/%c", dir.path().c_str(), 'g') +
+                      zv_util_open(&fd, nullptr, O_RDONLY, 0, "%s/%c", dir.path.c_str(), 'g') +
                       zv_util_read_file(fd, &whole, &whole_size, nullptr) +
                       zv_util_read_named_file(g.c_str(), &named, &named_size, nullptr), ZV_OK);
         content += '\0';
@@ -153,10 +171,10 @@ TEST(NamedFiles, WriteAppendReadCopySyncAndCloseOnExec)
         std::free(named), std::free(whole), close(fd);
     }
     FILE *stream = nullptr;
-    ASSERT_EQ(zv_util_fopen(&stream, nullptr, "a", "%s/%c", dir.path().c_str(), 'g'), ZV_OK);
+    ASSERT_EQ(zv_util_fopen(&stream, nullptr, "a", "%s/%c", dir.path.c_str(), 'g'), ZV_OK);
     std::fputs("!", stream);
-    std::string longest = dir.path() + std::string(998 - dir.path().size(), '/') + "g";  // 999
-    EXPECT_EQ(zv_util_sync(stream, nullptr) + zv_util_sync(stream, dir.path().c_str()) +
+    std::string longest = dir.path + std::string(998 - dir.path.size(), '/') + "g";  // 999
+    EXPECT_EQ(zv_util_sync(stream, nullptr) + zv_util_sync(stream, dir.path.c_str()) +
                   zv_util_sync_file(longest.c_str()) + std::fclose(stream), ZV_OK);
     EXPECT_EQ(get_file(g), std::string(70000, 'q') + "!");
     uint32_t exists = 0, gone = 1, owner = 0, count = 0, *pids = nullptr;
@@ -175,11 +193,7 @@ TEST(NamedFiles, WriteAppendReadCopySyncAndCloseOnExec)
     std::free(pids);
     // What the library opens for itself is close-on-exec, so a child another thread
     // starts inherits none of it; the caller's own flags and modes pass unchanged.
-    std::string inheritable;
-    for (const zvt::OpenCall &call : zvt::open_log())
-        if (call.flags == -1 ? !std::strchr(call.mode, 'e') : !(call.flags & O_CLOEXEC))
-            inheritable += (call.flags == -1 ? call.mode : std::to_string(call.flags)) + " ";
-    EXPECT_EQ(inheritable, "0 0 0 a ") << "only the caller's three descriptors and one stream";
+    EXPECT_EQ(zvt::inheritable_opens(), "0 0 0 a ") << "only the caller's own three and one";
 }
 
 TEST(Directories, PathsCreateScanQuery)
@@ -202,7 +216,7 @@ TEST(Directories, PathsCreateScanQuery)
                   zv_util_mkdir_read_only((dir / "gamma").c_str()), ZV_OK);
     ASSERT_EQ(stat((dir / "delta").c_str(), &rw) | stat((dir / "gamma").c_str(), &ro), 0);
     EXPECT_EQ((rw.st_mode & 0777) << 12 | (ro.st_mode & 0777), 0700'0500u);
-    zv_util_dirscan_state *scan = zv_util_dirscan_begin(dir.path().c_str());
+    zv_util_dirscan_state *scan = zv_util_dirscan_begin(dir.path.c_str());
     EXPECT_EQ(zv_dirscan_file_name(scan), nullptr) << "no current entry before the first advance";
     std::string names;
     for (char *name; zv_util_dirscan(scan) == ZV_OK; std::free(name))
@@ -212,9 +226,9 @@ TEST(Directories, PathsCreateScanQuery)
     EXPECT_EQ(zv_dirscan_file_name(scan), nullptr) << "no current entry after the end";
     zv_util_dirscan_end(scan);
     size_t heap = zvt::heap_in_use();
-    ASSERT_EQ(zv_util_dirscan(scan = zv_util_dirscan_begin(dir.path().c_str())), ZV_OK);
+    ASSERT_EQ(zv_util_dirscan(scan = zv_util_dirscan_begin(dir.path.c_str())), ZV_OK);
     EXPECT_EQ(zvt::with_fault("alloc", 1, ENOMEM, ZVT_CALL(zv_dirscan_file_name(scan))), nullptr);
-    zv_util_dirscan_end(scan);  // ended midway: everything released
+    zv_util_dirscan_end(scan), zv_util_dirscan_end(nullptr);  // ended midway: all released
     EXPECT_EQ(zvt::heap_in_use(), heap);
     unsigned fds = zvt::open_fd_count();
     uint32_t found[3] = {9, 9, 9};
@@ -225,6 +239,7 @@ TEST(Directories, PathsCreateScanQuery)
     EXPECT_EQ(zvt::open_fd_count(), fds);
     // A scan that cannot start is a NULL result alone, with errno kept.
     EXPECT_TRUE(zv_util_dirscan_begin(kAbsent) == nullptr && errno == ENOENT);
+    EXPECT_EQ(zvt::with_fault("alloc", 1, ENOMEM, ZVT_CALL(zv_util_dirscan_begin("/"))), nullptr);
 }
 
 }  // namespace

@@ -1,8 +1,5 @@
 // Option table parser: matching rules, handlers and failure frames.
-#include <vector>
-
-#include "support/scratch.h"
-#include <zvutil/getopt.h>
+#include "support/zvt.h"
 
 namespace {
 
@@ -32,9 +29,6 @@ zv_status parse(std::vector<const char *> args)
     return status;
 }
 
-// A failure row of zv_util_<fn> called with the rest: its one frame with |st|.
-#define ROW(st, fn, ...) zvt::FailureRow{"zv_util_" #fn, st, ZVT_CALL(zv_util_##fn(__VA_ARGS__))}
-
 TEST(Getopt, FormsHandlersAndFailures)
 {
     for (auto [args, expected] :
@@ -57,20 +51,22 @@ TEST(Getopt, FormsHandlersAndFailures)
         int_r{0, "", zv_util_getopt_int, &number, 1}, set{0, "", zv_util_getopt_flag, &number, 0};
     zvt::expect_failures({
         {str.c_str(), bad, ZVT_CALL(parse({"prog", "-o", k301.c_str()}))},
+        {str.c_str(), bad, ZVT_CALL(parse({"prog", "-o", "a", "/o", "b"}))},  // given twice
         {str.c_str(), ZV_ERR_NO_MEMORY, ZVT_CALL(parse({"prog", "-o", "a"})), "alloc"},
         {num.c_str(), bad, ZVT_CALL(parse({"prog", "-n", k301.c_str()}))},
         {num.c_str(), bad, ZVT_CALL(parse({"prog", "-n", "-2147483649"}))},
         {("zv_util_getopt_flag" + tail).c_str(), bad, ZVT_CALL(parse({"prog", "-f", "x"}))},
         {tail.c_str() + 1, ZV_ERR_SYSTEM, ZVT_CALL(parse({"prog", "-o", "a", "--count"})), nullptr,
          1, zvt::kUntouched, "Missing mandatory option"},
-        ROW(null, getopt, 1, nullptr, table, 1), ROW(bad, getopt, 0, argv, table, 1),
-        ROW(null, getopt_from, 1, argv, nullptr, 1, 0), ROW(bad, getopt_from, 1, argv, table, 0, 0),
-        ROW(bad, getopt_from, 0, argv, table, 1, 0),
+        ROW(null, getopt, (1, nullptr, table, 1)), ROW(bad, getopt, (0, argv, table, 1)),
+        ROW(null, getopt_from, (1, argv, nullptr, 1, 0)),
+        ROW(bad, getopt_from, (1, argv, table, 0, 0)),
+        ROW(bad, getopt_from, (0, argv, table, 1, 0)),
         {"", ZV_OK, ZVT_CALL(zv_util_getopt_from(1, argv, table, 1, 0))},
-        // Handlers on their own refuse each NULL inside their checks.
-        ROW(null, getopt_string, &str_r, nullptr, &used), ROW(null, getopt_string, &str_r, "7", 0),
-        ROW(null, getopt_int, &int_r, nullptr, &used), ROW(null, getopt_int, &int_r, "7", nullptr),
-        ROW(null, getopt_flag, &set, nullptr, nullptr)});
+        // Handlers on their own refuse a NULL inside their checks.
+        ROW(null, getopt_string, (&str_r, nullptr, &used)),
+        ROW(null, getopt_int, (&int_r, nullptr, &used)),
+        ROW(null, getopt_flag, (&set, nullptr, nullptr))});
     EXPECT_EQ(zv_util_getopt_string(&str_r, "7", consumed) |
                   zv_util_getopt_int(&int_r, "7", consumed + 1) |
                   zv_util_getopt_flag(&set, nullptr, consumed + 2), ZV_OK);

@@ -1,21 +1,12 @@
 // Hash, generator, running sums, overflow predicates, power-of-two rounding
 // and the processor features behind the vector paths.
-#include <cstring>
 #include <random>
-#include <vector>
 
-#include "support/feature_paths.h"
-#include "support/scratch.h"
-#include <zvutil/zvutil.h>
+#include "support/zvt.h"
 
 namespace {
 
 using Words = std::vector<uint64_t>; using State = zv_util_prng_state;
-
-// A failure row of zv_util_<fn> called with |args|: its one frame with |st|,
-// then any other fields of FailureRow by name.
-#define ROW(st, fn, args, ...) zvt::FailureRow{.frames = "zv_util_" #fn, .status = st, \
-    .call = ZVT_CALL(zv_util_##fn args) __VA_OPT__(, ) __VA_ARGS__}
 
 // Lengths around the short forms, the block, the vector lane and the prefetch
 // stride, on every path, at every alignment, ending where the buffer does.
@@ -93,11 +84,17 @@ TEST(Prng, KnownSequencesFillsAndFailures)
     });
 
     // One NULL at a time.
+    auto fill = [&](State *of, uint32_t length) { return zv_util_prng_fill(of, &next, length); };
     zvt::expect_failures({
         {"zv_util_prng_unpacked", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_prng(&state, nullptr))},
         ROW(ZV_ERR_NULL_ARG, prng_unpacked, (&state.position, nullptr, state.pool, &mixed)),
         ROW(ZV_ERR_NULL_ARG, prng_batch, (&state, nullptr, 1)),
         ROW(ZV_ERR_BAD_VALUE, mix_into_prng, (&state, 7, nullptr)),
+        ROW(ZV_ERR_NULL_ARG, seed_prng, (nullptr, 1, 0)),
+        {"zv_util_prng_unpacked", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_prng(nullptr, &mixed))},
+        ROW(ZV_ERR_NULL_ARG, prng_fill, (&state, nullptr, 3)),
+        {"zv_util_prng_batch,zv_util_prng_fill", ZV_ERR_NULL_ARG, ZVT_CALL(fill(nullptr, 8))},
+        {"zv_util_prng_batch,zv_util_prng_fill", ZV_ERR_NULL_ARG, ZVT_CALL(fill(nullptr, 3))},
         {"", ZV_OK, ZVT_CALL(zv_util_prng_fill(nullptr, nullptr, 0))}});
 }
 
@@ -117,6 +114,7 @@ TEST(Numeric, SumsPowersOfTwoAndOverflow)
     zvt::expect_failures({
         {"", ZV_OK, [&] { zv_status s = zv_util_sum_init(&w, 3); zv_util_sum_free(&w); return s; }},
         ROW(ZV_ERR_BAD_VALUE, sum_init, (&w, 0), .log = "N is zero"),
+        ROW(ZV_ERR_NULL_ARG, sum_init, (nullptr, 1)),
         ROW(ZV_ERR_NO_MEMORY, sum_init, (&w, 4), .point = "alloc", .log = "calloc() failed, N=4")});
 
     for (auto [value, up, down] : std::initializer_list<std::tuple<uint32_t, uint32_t, uint32_t>>{

@@ -1,17 +1,9 @@
 // Threads failing library calls while the log sink is swapped, and first
 // callers racing the processor check. Meant for ThreadSanitizer (preset tsan).
-#include <gtest/gtest.h>
-
 #include <atomic>
-#include <cstring>
-#include <string>
 #include <thread>
 
-#include <zverrortrace.h>
-#include <zvlog.h>
-#include <zvutil/zvutil.h>
-
-#include "cpu.h"
+#include "support/zvt.h"
 
 // A sink that finds another sink's context, or one replaced before the set
 // returned, marks it wrong.

@@ -1,12 +1,12 @@
 // Deadlines, time values, calendar time, wall clock and timers.
 #include <tuple>
 
-#include "support/scratch.h"
-#include "support/wrap_time.h"
+#include "support/zvt.h"
 #include "time/time_internal.h"
-#include <zvutil/timeutil.h>
 
 namespace {
+
+using zv::zv_util_query_timeout_expired;  // internal: the rows name it without zv::
 
 template <class... T> using Rows = std::initializer_list<std::tuple<T...>>;
 constexpr time_t kMax = 0x7FFFFFFF;
@@ -46,26 +46,20 @@ TEST(Deadline, OffsetExpiryOrderAndTimeLeft)
              {{50, 499999999}, -1, "-1.000000e-09"}, {{52, 250000000}, 1, "1.750000e+00"},
              {{49, 750000000}, -1, "-7.500000e-01"}}) {
         uint32_t expired = 7; int32_t cmp = 7; char text[32];
-        EXPECT_EQ(zv::zv_util_query_timeout_expired(&deadline, &expired) |
+        EXPECT_EQ(zv_util_query_timeout_expired(&deadline, &expired) |
                       zv_util_query_timeout_left(&deadline, text, 32) |
                       zv_util_cmp_timeout(&deadline, &now, &cmp), kOk);
         EXPECT_TRUE(expired == (order < 1) && cmp == order && text == left + " seconds") << text;
     }
 }
 
-// A failure row of zv_util_<fn> called with |args|: its one frame with |st|,
-// then any other fields of FailureRow by name.
-#define ROW(st, fn, args, ...) zvt::FailureRow{.frames = "zv_util_" #fn, .status = st, \
-    .call = ZVT_CALL(zv_util_##fn args) __VA_OPT__(, ) __VA_ARGS__}
-
 TEST(Clock, PinnedReadingsAndFailures)
 {
     Pinned clock({kMax - 5, 623456789});
     timespec ts{}; timeval tv{};
     EXPECT_TRUE(zv_util_future_timeout(&ts, 4500, 1000) == kOk && at(ts) == at({kMax, 123456789}));
-    // A refused deadline keeps the clock reading.
-    EXPECT_TRUE(zv_util_future_timeout(&ts, 6, 1) == kOver && at(ts) == at({kMax - 5, 623456789}));
     EXPECT_TRUE(zv_util_future_time(5, &tv) == kOk && tv.tv_sec == kMax);
+    EXPECT_TRUE(zv_util_future_time(0, &tv) == kOk && tv.tv_sec == kMax - 5);
     EXPECT_TRUE(zv_util_future_time(6, &tv) == kOver && tv.tv_sec == kMax - 5);
     EXPECT_EQ(zv_util_walltime_msec(), (kMax - 5) * int64_t{1000} + 623);
     EXPECT_EQ(zv_util_walltime_usec(), (kMax - 5) * int64_t{1000000} + 623456);
@@ -81,23 +75,36 @@ TEST(Clock, PinnedReadingsAndFailures)
     EXPECT_STREQ(text, "Tue Feb 29 00:00:00 2000\n");
     EXPECT_TRUE(zv_util_localtime_r(&when, &now) == &now && now.tm_yday == 59 && now.tm_hour == 0);
 
-    // What only a failure shows: one NULL at a time, a failed clock or
-    // rendering, and the frames and log line of a failed offset.
+    // What only a failure shows: a NULL after a valid pointer, a failed clock
+    // or rendering, and the frames and log lines of a refused deadline.
     int32_t *err = &zvt::row_errno;
+    uint32_t expired = 7;
+    const char *no_clock = "Failed to get current time.";
     zvt::expect_failures({
         ROW(kBad, abs_time_offset, (&ts, 5, 0), .log = "Bad value, val: 5 scale_to_sec: 0"),
-        ROW(kNull, timeval_to_ms, (nullptr, &ms)), ROW(kNull, timeval_to_ms, (&tv, nullptr)),
+        {.frames = "zv_util_abs_time_offset,zv_util_future_timeout", .status = kOver,
+         .call = ZVT_CALL(zv_util_future_timeout(&ts, 6, 1)),
+         .log = "Overflow detected when trying to set phase timeout tmp hack", .log_after = 2},
+        ROW(kSys, future_timeout, (&ts, 1, 1), .point = "clock_gettime", .log = no_clock),
+        ROW(kSys, query_timeout_expired, (&ts, &expired), .point = "clock_gettime"),
+        ROW(kSys, query_timeout_left, (&ts, text, 32), .point = "clock_gettime", .log = no_clock),
+        ROW(kNull, future_time, (5, nullptr)), ROW(kBad, future_time, (-1, &tv)),
+        ROW(kSys, future_time, (5, &tv), .point = "gettimeofday"),
+        {.frames = "", .status = kNull, .call = ZVT_CALL(zv_util_ms_to_timeval(1, nullptr))},
+        ROW(kNull, timeval_to_ms, (&tv, nullptr)), ROW(kNull, asctime, (&now, nullptr, 26)),
+        ROW(kNull, now_str, (text, nullptr, err)), ROW(kBad, now_str, (text, &(ms = 25), err)),
+        ROW(ZV_ERR_TOO_SMALL, asctime, (&now, text, 25)),
         ROW(kSys, get_broken_down_time, (&now), .point = "time", .log = "Failed to read time"),
-        ROW(kNull, asctime, (nullptr, text, 26)), ROW(kNull, asctime, (&now, nullptr, 26)),
-        ROW(kNull, now_str, (nullptr, &size, err)), ROW(kNull, now_str, (text, nullptr, err)),
         ROW(kSys, now_str, (text, &size, err), .point = "time", .err = EIO),
         ROW(kSys, now_str, (text, &size, err), .point = "ctime_r", .err = EIO),
         ROW(kSys, asctime, (&now, text, 26), .point = "asctime_r"),
         ROW(kSys, gmtime, (&when, &now), .point = "gmtime_r"),
-        ROW(kSys, get_broken_down_time, (&now), .point = "localtime_r", .log = "Failed to unpick time"),
+        ROW(kSys, get_broken_down_time, (&now), .point = "localtime_r",
+            .log = "Failed to unpick time"),
     });
-    // A failed rendering leaves the empty string.
-    EXPECT_TRUE(text[0] == '\0' && zv_util_cmp_timeout(&ts, nullptr, err) == kNull) << text;
+    // A refused deadline keeps the clock reading; a failed rendering leaves the empty string.
+    EXPECT_TRUE(at(ts) == at({kMax - 5, 623456789}) && expired == 7 && text[0] == '\0' &&
+                zv_util_cmp_timeout(&ts, nullptr, err) == kNull) << text;
     // These report a failed reading by their result alone.
     EXPECT_EQ(zvt::with_fault("gettimeofday", 1, EIO, zv_util_walltime_msec), 0);
     EXPECT_EQ(zvt::with_fault("gettimeofday", 1, EIO, zv_util_walltime_usec), 0);

@@ -1,21 +1,12 @@
-#include "support/fault.h"
-
-#include <gtest/gtest.h>
-#include <zverrortrace.h>
+// Fault points, the wrappers that serve them, and the heap and descriptor counts.
+#include "support/zvt.h"
 
 #include <cstdarg>
-#include <cstring>
 #include <cwchar>
 #include <dirent.h>
-#include <fcntl.h>
-#include <filesystem>
-#include <grp.h>
 #include <malloc.h>
 #include <signal.h>
-#include <sys/stat.h>
 #include <sys/time.h>
-
-#include "support/wrap_time.h"
 
 #if defined(__SANITIZE_ADDRESS__)
 extern "C" size_t __sanitizer_get_current_allocated_bytes(void);
@@ -31,8 +22,8 @@ struct Rule {
     unsigned nth, extra, calls;
     int err;
 } rules[8];
-unsigned rule_count, open_count;
-OpenCall opens[512];  // room for a scan of every /proc entry
+unsigned rule_count;
+char inheritable[256];
 std::optional<timespec> pinned;
 
 bool known(const char *point)
@@ -45,17 +36,6 @@ bool known(const char *point)
     return false;
 }
 
-#if !defined(__SANITIZE_ADDRESS__)
-// glibc counts a block parked in its per-thread cache as in use, so the leak
-// checks need that cache off, as ctest's environment has it.
-const bool cache_off = [] {
-    void *volatile block = std::malloc(100);
-    size_t held = mallinfo2().uordblks;
-    std::free(block);
-    return mallinfo2().uordblks < held;
-}();
-#endif
-
 }  // namespace
 
 void fault_arm(const char *point, unsigned nth, int err, unsigned count)
@@ -67,14 +47,6 @@ void fault_arm(const char *point, unsigned nth, int err, unsigned count)
 
 void fault_clear() { rule_count = 0; }
 
-unsigned fault_calls(const char *point)
-{
-    for (unsigned i = 0; known(point) && i < rule_count; i++)
-        if (std::strcmp(rules[i].point, point) == 0)
-            return rules[i].calls;
-    return 0;
-}
-
 bool fault_hit(const char *point)
 {
     for (Rule *r = rules; r != rules + rule_count; r++)
@@ -84,25 +56,14 @@ bool fault_hit(const char *point)
     return false;
 }
 
-void log_open(const char *function, const char *path, int flags, const char *mode)
+void note_open(bool cloexec, const char *what)
 {
-    if (open_count < std::size(opens)) {
-        OpenCall &call = opens[open_count];
-        std::strncpy(call.function, function, sizeof call.function - 1);
-        std::strncpy(call.path, path != nullptr ? path : "", sizeof call.path - 1);
-        std::strncpy(call.mode, mode != nullptr ? mode : "", sizeof call.mode - 1);
-        call.flags = flags;
-    }
-    open_count++;
+    size_t used = std::strlen(inheritable);
+    if (!cloexec)
+        std::snprintf(inheritable + used, sizeof inheritable - used, "%s ", what);
 }
 
-void open_log_clear() { open_count = 0; }
-
-std::vector<OpenCall> open_log()
-{
-    EXPECT_LE(open_count, std::size(opens)) << "the open log overflowed";
-    return {opens, opens + std::min<size_t>(open_count, std::size(opens))};
-}
+std::string inheritable_opens() { return inheritable; }
 
 void pin_clock(std::optional<timespec> now) { pinned = now; }
 
@@ -111,7 +72,9 @@ size_t heap_in_use()
 #if defined(__SANITIZE_ADDRESS__)
     return __sanitizer_get_current_allocated_bytes();
 #else
-    EXPECT_TRUE(cache_off) << "glibc's per-thread cache is on: run through ctest";
+    // glibc counts a block parked in its per-thread cache as in use, so the leak
+    // checks need that cache off, as ctest's environment has it.
+    EXPECT_TRUE(std::strstr(getenv("GLIBC_TUNABLES") ?: "", "tcache_count=0")) << "run by ctest";
     return mallinfo2().uordblks;
 #endif
 }
@@ -121,12 +84,12 @@ unsigned open_fd_count()
     return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
 }
 
-// Every test starts with an empty trace and open log and no armed fault.
+// Every test starts with an empty trace, no noted opens and no armed fault.
 struct Reset : ::testing::EmptyTestEventListener {
     void OnTestStart(const ::testing::TestInfo &) override
     {
         fault_clear();
-        open_log_clear();
+        inheritable[0] = '\0';
         zv_trace_clear();
     }
 };
@@ -162,10 +125,11 @@ WRAP(fstat64, int, (int a, struct stat64 *b), "fstat", -1,
 // overlay file systems do.
 WRAP(stat64, int, (const char *a, struct stat64 *b), "stat", -1,
      __real_stat64(a, b) != 0 ? -1 : HIT("stat_wide_inode") ? (b->st_ino |= 1ull << 40, 0) : 0)
-// A failed transfer sets the stream's error indicator, as glibc does; an armed
-// "ferror" reports it set; a failing fclose still releases the stream.
+// A failed transfer sets the stream's error indicator, as glibc does;
+// "fwrite_idle" writes nothing and sets nothing; an armed "ferror" reports the
+// indicator set; a failing fclose still releases the stream.
 WRAP(fwrite, size_t, (const void *a, size_t b, size_t c, FILE *d), "fwrite",
-     (d->_flags |= _IO_ERR_SEEN, 0), __real_fwrite(a, b, c, d))
+     (d->_flags |= _IO_ERR_SEEN, 0), HIT("fwrite_idle") ? 0 : __real_fwrite(a, b, c, d))
 WRAP(fflush, int, (FILE *a), "fflush", EOF, __real_fflush(a))
 WRAP(ferror, int, (FILE *a), "ferror", 1, __real_ferror(a))
 WRAP(fclose, int, (FILE *a), "fclose",
@@ -203,11 +167,11 @@ WRAP(asctime_r, char *, (const tm *a, char *b), "asctime_r", nullptr, __real_asc
 // could be handed.
 WRAP(ctime_r, char *, (const time_t *a, char *b), "ctime_r",
      (std::memset(b, '#', 26), nullptr), __real_ctime_r(a, b))
-// The open calls the library makes also go to the open log.
+// The open calls also note what they leave inheritable.
 FILE *__real_fopen(const char *path, const char *mode);
 FILE *__wrap_fopen(const char *path, const char *mode)
 {
-    zvt::log_open("fopen", path, -1, mode);
+    zvt::note_open(std::strchr(mode, 'e') != nullptr, mode);
     return HIT("fopen") ? nullptr : __real_fopen(path, mode);
 }
 
@@ -218,7 +182,9 @@ int __wrap_open(const char *path, int flags, ...)
     va_start(args, flags);
     mode_t mode = __OPEN_NEEDS_MODE(flags) ? va_arg(args, unsigned) : 0;
     va_end(args);
-    zvt::log_open("open", path, flags, "");
+    char text[16];
+    std::snprintf(text, sizeof text, "%d", flags);
+    zvt::note_open(flags & O_CLOEXEC, text);
     return HIT("open") ? -1 : __real_open(path, flags, mode);
 }
 
