@@ -36,6 +36,10 @@ TEST(Descriptors, WholeTransfersAndLineCounts)
     EXPECT_EQ(zv_util_whole_read(-1, nullptr, 1) + zv_util_whole_read(-1, buf, -1), -2 * EINVAL);
     EXPECT_EQ(zv_util_whole_write(-1, "", 0, nullptr) + zv_util_whole_read(-1, buf, 0), 0);
     EXPECT_EQ(close(ends[0]) + close(ends[1]), 0);
+    ASSERT_EQ(pipe(ends), 0);
+    zvt::fault_arm("write_short", 1, 0);  // the rest follows in a second write
+    EXPECT_EQ(zv_util_whole_write(ends[1], "abcd", 4, nullptr), ZV_OK);
+    EXPECT_TRUE(close(ends[1]) == 0 && read(ends[0], buf, sizeof buf) == 4 && close(ends[0]) == 0);
 
     zvt::ScratchDir dir;
     zvt::in_child(false, [&] {  // lines counted on descriptor 0, which is an ordinary one

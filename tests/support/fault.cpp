@@ -111,11 +111,12 @@ extern "C" {
 WRAP(malloc, void *, (size_t a), "alloc", nullptr, __real_malloc(a))
 WRAP(calloc, void *, (size_t a, size_t b), "alloc", nullptr, __real_calloc(a, b))
 WRAP(strndup, char *, (const char *a, size_t b), "alloc", nullptr, __real_strndup(a, b))
-// "read_idle" and "write_idle" make a call return 0 without moving a byte.
+// "read_idle" and "write_idle" make a call return 0 without moving a byte;
+// "write_short" moves one byte at most.
 WRAP(read, ssize_t, (int a, void *b, size_t c), "read", -1,
      HIT("read_idle") ? 0 : __real_read(a, b, c))
 WRAP(write, ssize_t, (int a, const void *b, size_t c), "write", -1,
-     HIT("write_idle") ? 0 : __real_write(a, b, c))
+     HIT("write_idle") ? 0 : __real_write(a, b, HIT("write_short") && c > 1 ? 1 : c))
 WRAP(fsync, int, (int a), "fsync", -1, __real_fsync(a))
 // "fstat_grown" reports a file 100 bytes larger than it is, as if it had
 // shrunk since it was measured.
