@@ -101,7 +101,7 @@ TEST(Files, FailureTable)
         {"zv_util_open", kSys, ZVT_CALL(zv_util_open(&out, kErr, 0, 0, kAbsent)), 0, 1, ENOENT},
         {"zv_util_fopen", kSys, ZVT_CALL(zv_util_fopen(&stream, kErr, "r", kAbsent)), 0, 1, ENOENT},
         {"zv_util_vasprintf", kMem, ZVT_CALL(zv_util_open(&out, kErr, 0, 0, kAbsent)), "alloc"},
-        {"zv_util_vasprintf,zv_util_fopen", kMem, ZVT_CALL(zv_util_fopen(&stream, kErr, "r", "")),
+        {"zv_util_vasprintf,zv_util_fopen", kMem, ZVT_CALL(zv_util_fopen(&stream, kErr, "r", "x")),
          "alloc"},
         {"zv_util_whole_write", kSys, ZVT_CALL(zv_util_whole_write(-1, "a", 1, kErr)), 0, 1, EBADF},
         {"zv_util_whole_write", ZV_ERR_OVERFLOW, ZVT_CALL(zv_util_whole_write(-1, "a", -1, kErr))},

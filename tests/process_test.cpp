@@ -108,7 +108,7 @@ TEST(PidFile, Claims)
     const char *texts[] = {"0", "4294967295", "4294967296", "00000000001", "self", "../1", "1\n"};
     for (int i = 0; i < 7; i++)
         zvt::expect_failures(
-            {{i < 2 ? looked_up : "", i < 2 ? kSys : ZV_OK, over(texts[i]), "open", 4}});
+            {{i < 2 ? looked_up : "", i < 2 ? kSys : zv_status{ZV_OK}, over(texts[i]), "open", 4}});
     stop_child(holder), waitpid(ended, nullptr, 0);
 }
 

@@ -233,7 +233,7 @@ TEST(Strings, FailureTable)
         // The new length and its NUL: one past 32 bits, then just fitting.
         {add, kOver, ZVT_CALL(zv_util_append_string(&out, &lengths[1], "xy", 2))},
         {add, kMem, ZVT_CALL(zv_util_append_string(&out, &lengths[2], "xy", 2)), "alloc"},
-        {vas, kNull, ZVT_CALL(zv_util_asprintf(&out, &zvt::row_errno, no_format))},
+        {vas, kNull, ZVT_CALL(zv_util_asprintf(&out, &zvt::row_errno, no_format, 0))},
         {"zv_util_printf_vsize", kNull, ZVT_CALL(vsize(nullptr, "x"))},
         {"zv_util_printf_vsize,zv_util_vasprintf", ZV_ERR_SYSTEM, format, "vsnprintf"},
         {vas, ZV_ERR_SYSTEM, format, "vsnprintf", 2, EIO},
