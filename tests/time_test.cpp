@@ -27,16 +27,17 @@ TEST(Deadline, OffsetExpiryOrderAndTimeLeft)
     // 3 / 3 is whole units, not 3 * 333333333 ns. Nanoseconds far out of
     // range, which a 64-bit long holds, overflow too.
     const long far = static_cast<long>(sizeof(long) == 8 ? 4000000000 : 0);
+    const long edge = static_cast<long>(sizeof(long) == 8 ? 3147483646 : 0);  // carries to 2^31 - 1
     for (auto [start, val, scale, status, end] : Rows<timespec, int, int, zv_status, timespec>{
              {{10, 600000000}, 1500, 1000, kOk, {12, 100000000}},
              {{10, 600000000}, 400000000, 1000000000, kOk, {11, 0}},
              {{10, 600000000}, 0, 1, kOk, {10, 600000000}}, {{0, 5}, 3, 3, kOk, {1, 5}},
              {{kMax - 1, 999999999}, 1, 1, kOk, {kMax, 999999999}},
-             {{0, 999999998}, 1, 1000000000, kOk, {0, 999999999}},  // the last nanosecond
              {{kMax - 5, 0}, INT32_MAX, 1, kOver, {kMax - 5, 0}},
              {{kMax - 1, 900000000}, 1100, 1000, kOver, {kMax, 0}},  // at the carry
              {{4, 5}, -1, 1000, kBad, {4, 5}}, {{4, 5}, 5, 1000000001, kBad, {4, 5}},
-             {{0, far}, 0, 1, far ? kOver : kOk, {far != 0, 0}}})
+             {{0, far}, 0, 1, far ? kOver : kOk, {far != 0, 0}},
+             {{0, edge}, 1, 1000000000, kOk, {edge != 0, edge ? 0x7FFFFFFF : 1}}})
         EXPECT_TRUE(zv_util_abs_time_offset(&start, val, scale) == status && at(start) == at(end))
             << val << "/" << scale;
 
