@@ -160,6 +160,10 @@ TEST(NamedFiles, WriteAppendReadCopySyncAndCloseOnExec)
                   zv_util_write_named_file(f.c_str(), 0, "+more", 5, nullptr) +  // appended
                   zv_util_copy_file(f.c_str(), f.c_str()), ZV_OK);              // onto itself
     EXPECT_EQ(get_file(f), "new+more");
+    zvt::fault_arm("fwrite_short", 1, 0);  // the rest follows in a second call
+    EXPECT_TRUE(zv_util_write_named_file(f.c_str(), 1, "data", 4, nullptr) == ZV_OK &&
+                get_file(f) == "data");
+    zvt::fault_clear();
     for (std::string content : {std::string("x\0y", 3), std::string(), std::string(70000, 'q')}) {
         char *named = nullptr, *whole = nullptr;
         uint32_t named_size = 99, whole_size = 99;

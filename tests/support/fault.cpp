@@ -127,10 +127,12 @@ WRAP(fstat64, int, (int a, struct stat64 *b), "fstat", -1,
 WRAP(stat64, int, (const char *a, struct stat64 *b), "stat", -1,
      __real_stat64(a, b) != 0 ? -1 : HIT("stat_wide_inode") ? (b->st_ino |= 1ull << 40, 0) : 0)
 // A failed transfer sets the stream's error indicator, as glibc does;
-// "fwrite_idle" writes nothing and sets nothing; an armed "ferror" reports the
-// indicator set; a failing fclose still releases the stream.
+// "fwrite_idle" writes nothing and sets nothing, "fwrite_short" one item at
+// most; an armed "ferror" reports the indicator set; a failing fclose still
+// releases the stream.
 WRAP(fwrite, size_t, (const void *a, size_t b, size_t c, FILE *d), "fwrite",
-     (d->_flags |= _IO_ERR_SEEN, 0), HIT("fwrite_idle") ? 0 : __real_fwrite(a, b, c, d))
+     (d->_flags |= _IO_ERR_SEEN, 0),
+     HIT("fwrite_idle") ? 0 : __real_fwrite(a, b, HIT("fwrite_short") && c > 1 ? 1 : c, d))
 WRAP(fflush, int, (FILE *a), "fflush", EOF, __real_fflush(a))
 WRAP(ferror, int, (FILE *a), "ferror", 1, __real_ferror(a))
 WRAP(fclose, int, (FILE *a), "fclose",
