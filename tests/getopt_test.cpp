@@ -35,6 +35,7 @@ TEST(Getopt, FormsHandlersAndFailures)
          std::initializer_list<std::pair<std::vector<const char *>, std::string>>{
              {{"-v"}, "0 -1 -"},  // the program's name is not parsed
              {{"prog", "/v", "--output", k300.c_str(), "-count", k300.c_str()}, "1 -42 " + k300},
+             {{"prog", nullptr, "-v"}, "1 -1 -"},  // a NULL entry is passed over
              {{"prog", "--verbose", "/output", "-v", "/n", "2147483647", "-n", "-2147483648x"},
               "1 -2147483648 -v"},  // values taken unchanged
              {{"prog", "--Verbose", "--verb", "-vo", "-", "/", "xv", "-z", "--zzz", kLong.c_str()},
@@ -48,7 +49,8 @@ TEST(Getopt, FormsHandlersAndFailures)
     uint32_t used, consumed[3];
     // Records for the string, integer and flag handlers on their own.
     const zv_util_option str_r{0, "", zv_util_getopt_string, &text, 1},
-        int_r{0, "", zv_util_getopt_int, &number, 1}, set{0, "", zv_util_getopt_flag, &number, 0};
+        int_r{0, "", zv_util_getopt_int, &number, 1}, set{0, "", zv_util_getopt_flag, &number, 0},
+        no_handler{'v', "", nullptr, &number, 0};
     zvt::expect_failures({
         {str.c_str(), bad, ZVT_CALL(parse({"prog", "-o", k301.c_str()}))},
         {str.c_str(), bad, ZVT_CALL(parse({"prog", "-o", "a", "/o", "b"}))},  // given twice
@@ -63,6 +65,7 @@ TEST(Getopt, FormsHandlersAndFailures)
         ROW(bad, getopt_from, (1, argv, table, 0, 0)),
         ROW(bad, getopt_from, (0, argv, table, 1, 0)),
         {"", ZV_OK, ZVT_CALL(zv_util_getopt_from(1, argv, table, 1, 0))},
+        {tail.c_str() + 1, null, ZVT_CALL(zv_util_getopt_from(1, argv, &no_handler, 1, 0))},
         // Handlers on their own refuse a NULL inside their checks.
         ROW(null, getopt_string, (&str_r, nullptr, &used)),
         ROW(null, getopt_int, (&int_r, nullptr, &used)),
