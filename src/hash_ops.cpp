@@ -127,7 +127,7 @@ ZV_TARGET("sse2") inline __m128i block_lane(const unsigned char *bytes)
 }
 
 ZV_TARGET("sse2") uint64_t absorb_sse2(uint64_t state, const unsigned char *bytes,
-                                                     uint32_t blocks)
+                                       uint32_t blocks)
 {
     __m128i lane = _mm_loadl_epi64(reinterpret_cast<const __m128i *>(&state));
     for (; blocks >= kPrefetchBlocks + kLineBlocks; blocks -= kLineBlocks) {

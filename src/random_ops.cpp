@@ -209,16 +209,14 @@ template <int N>
     steps(position, weyl, pool, dest + size_t{8} * N * groups, count % N);
 }
 
-ZV_TARGET("avx2") void generate_avx2(uint32_t &position, uint64_t &weyl,
-                                                   uint64_t *pool, unsigned char *dest,
-                                                   uint32_t count)
+ZV_TARGET("avx2") void generate_avx2(uint32_t &position, uint64_t &weyl, uint64_t *pool,
+                                     unsigned char *dest, uint32_t count)
 {
     generate_lanes<4>(position, weyl, pool, dest, count);
 }
 
-ZV_TARGET("sse2") void generate_sse2(uint32_t &position, uint64_t &weyl,
-                                                   uint64_t *pool, unsigned char *dest,
-                                                   uint32_t count)
+ZV_TARGET("sse2") void generate_sse2(uint32_t &position, uint64_t &weyl, uint64_t *pool,
+                                     unsigned char *dest, uint32_t count)
 {
     generate_lanes<2>(position, weyl, pool, dest, count);
 }

@@ -96,8 +96,7 @@ ZV_EXPORT void zv_util_dirscan_end(zv_util_dirscan_state *scan)
 {
     if (scan == nullptr)
         return;
-    if (scan->entries != nullptr)
-        zv::free_array(scan->entries, static_cast<size_t>(scan->entry_count));
+    zv::free_array(scan->entries, static_cast<size_t>(scan->entry_count));
     std::free(scan);
 }
 
