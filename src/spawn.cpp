@@ -1,7 +1,18 @@
 // Spawn-and-wait in one call, and dropping a handle without waiting.
 #include <zvutil/process.h>
 
+#include <pthread.h>
+
 #include "internal.h"
+
+namespace {
+
+void release_handle(void *handle)
+{
+    zv_free_proc_handle(static_cast<zv_proc_handle **>(handle));
+}
+
+}  // namespace
 
 extern "C" {
 
@@ -12,9 +23,12 @@ ZV_EXPORT zv_status zv_spawn_and_wait(char *const argv[], char *const envp[],
     zv_status status = zv_spawn(argv, envp, &handle);
     if (status != ZV_OK)
         return ZV_FAIL(status);
+    // The wait is a cancellation point: a cancelled caller still releases the
+    // handle (the child is left to run and is not reaped). zv_wait keeps the
+    // handle on failure; nobody else can release this one.
+    pthread_cleanup_push(release_handle, &handle);
     status = zv_wait(&handle, exit_code);
-    // zv_wait keeps the handle on failure; nobody else can release this one.
-    zv_free_proc_handle(&handle);
+    pthread_cleanup_pop(1);
     return status;
 }
 

@@ -168,12 +168,48 @@ TEST(Spawn, ExitCodesArgumentsEnvironmentSignalStateAndNoProcessLeft)
         }
         EXPECT_EQ(zvt::heap_in_use(), heap);
         EXPECT_EQ(std::fseek(buffered, 0, SEEK_END) == 0 ? std::ftell(buffered) : -1L, 4L);
+        sigset_t mask;
+        sigprocmask(SIG_SETMASK, nullptr, &mask);
+        EXPECT_EQ(std::make_pair(sigismember(&mask, SIGUSR1), sigismember(&mask, SIGTERM)),
+                  std::make_pair(1, 0)) << "the caller's mask as it was";
     });
     zvt::in_child(true, [&] {  // a process that may start no other
         struct rlimit zero = {0, 0};
         ASSERT_EQ(setrlimit(RLIMIT_NPROC, &zero), 0);
         zvt::expect_failures(
             {{"zv_spawn", ZV_ERR_SYSTEM, ZVT_CALL(zv_spawn(run_true, env, &handle))}});
+    });
+}
+
+// A thread cancelled in the wait releases the handle; the child runs on.
+TEST(Spawn, CancelledWaitReleasesTheHandle)
+{
+    zvt::in_child(false, [] {
+        int gate[2];  // the children read it until this end closes
+        ASSERT_EQ(pipe2(gate, O_CLOEXEC), 0);
+        dup2(gate[0], 0);
+        auto cancel_a_wait = [] {
+            pthread_t waiter;
+            pthread_create(&waiter, nullptr, [](void *) -> void * {
+                const char *args[] = {"/bin/sh", "-c", "exec cat >/dev/null", nullptr};
+                int32_t code = 0;
+                zv_spawn_and_wait(const_cast<Argv>(args), env, &code);
+                return nullptr;
+            }, nullptr);
+            void *result = nullptr;
+            pthread_cancel(waiter), pthread_join(waiter, &result);
+            return result;
+        };
+        cancel_a_wait();  // the first cancellation loads the unwinder
+        size_t heap = zvt::heap_in_use();
+        EXPECT_EQ(cancel_a_wait(), PTHREAD_CANCELED);
+        EXPECT_EQ(zvt::heap_in_use(), heap);
+        close(gate[1]);
+        for (int child = 0; child < 2; child++) {
+            int status = -1;
+            pid_t reaped = waitpid(-1, &status, 0);
+            EXPECT_EQ(std::make_pair(reaped > 0, status), std::make_pair(true, 0)) << "ran on";
+        }
     });
 }
 
@@ -208,6 +244,8 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
              1, kUntouched, "Invalid or unsupported signal value"},
             {"zv_spawn,zv_spawn_and_wait", ZV_ERR_NO_MEMORY,
              ZVT_CALL(zv_spawn_and_wait(run_true, env, &code)), "alloc"},
+            {"zv_spawn,zv_spawn_and_wait", ZV_ERR_NO_MEMORY,  // the child's stack
+             ZVT_CALL(zv_spawn_and_wait(run_true, env, &code)), "mmap"},
             {"zv_wait", ZV_ERR_NULL_ARG, ZVT_CALL(zv_wait(&none, &code))},
             {"zv_wait", ZV_ERR_SYSTEM, ZVT_CALL(zv_wait(&handle, &code))},
             {"zv_wait", ZV_ERR_SYSTEM, ZVT_CALL(zv_spawn_and_wait(run_true, env, &code))},

@@ -1,6 +1,7 @@
 // Threads failing library calls while the log sink is swapped, and first
 // callers racing the processor check. Meant for ThreadSanitizer (preset tsan).
 #include <atomic>
+#include <sys/wait.h>
 #include <thread>
 
 #include "support/zvt.h"
@@ -77,4 +78,49 @@ TEST(Threads, SpawnBesideAThreadThatAllocatesAndLogs)
     busy.join();
     zv_log_set_sink(nullptr, nullptr);
     EXPECT_EQ(failed, 0);
+}
+
+TEST(Threads, SpawnFromSeveralThreadsAtOnce)
+{
+    std::atomic<int> failed{0};
+    run_threads([&](int) {
+        char path[] = "/bin/true", *argv[] = {path, nullptr};
+        for (int i = 0; i < 20; i++) {
+            int32_t code = -2;
+            failed += zv_spawn_and_wait(argv, argv + 1, &code) != ZV_OK;
+            failed += code != 0;
+        }
+    });
+    EXPECT_EQ(failed, 0);
+}
+
+// A child forked while another thread sits inside the sink logs and sets a
+// sink of its own at once.
+TEST(Threads, ForkWhileAnotherThreadIsInsideTheSink)
+{
+    static std::atomic<int> inside, leave;
+    inside = leave = 0;
+    zv_log_set_sink([](void *, int32_t, uint32_t, const char *, const char *, int32_t,
+                       const char *) {
+        for (inside = 1; !leave;)
+            std::this_thread::yield();
+    }, nullptr);
+    std::thread slow([] { zv_util_log_internal(3, 128, "slow", "f", 1, "held"); });
+    while (!inside)
+        std::this_thread::yield();
+    pid_t pid = fork();
+    if (pid == 0) {
+        alarm(1);  // a child that hangs ends by SIGALRM
+        static int lines = 0;
+        zv_log_set_sink([](void *, int32_t, uint32_t, const char *, const char *, int32_t,
+                           const char *) { lines++; }, nullptr);
+        zv_util_log_internal(3, 128, "child", "f", 2, "line");
+        _exit(lines == 1 ? 0 : 1);
+    }
+    int status = -1;
+    waitpid(pid, &status, 0);
+    leave = 1;
+    slow.join();
+    zv_log_set_sink(nullptr, nullptr);
+    EXPECT_EQ(status, 0);
 }

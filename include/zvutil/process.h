@@ -21,7 +21,8 @@ typedef struct zv_proc_handle {
 /* zv_spawn starts argv[0] (used as the path, no PATH search) with the argument
  * vector |argv| and the whole environment |envp|, both NULL-terminated, and
  * stores a new handle in |*handle_out|. None of the pointers is tested.
- *   ZV_ERR_NO_MEMORY  the handle cannot be allocated; |*handle_out| is NULL.
+ *   ZV_ERR_NO_MEMORY  the handle or the child's stack cannot be allocated;
+ *                     |*handle_out| is NULL.
  *   ZV_ERR_SYSTEM     the child process cannot be created; |*handle_out| is NULL.
  * One frame on each failure. A program that cannot be started is not seen
  * here: its child ends with exit status 1, which zv_wait reports. */
@@ -41,7 +42,9 @@ ZV_EXPORT zv_status zv_wait(zv_proc_handle **handle, int32_t *exit_code);
 /* zv_spawn_and_wait is zv_spawn followed by zv_wait on a handle of its own.
  * A failure of zv_spawn gets a second frame of this function; a failure of
  * zv_wait is passed on without one (the handle is released; the child is left
- * unreaped). |*exit_code| is written only on success. */
+ * unreaped: after an interrupted wait, EINTR, use zv_spawn and zv_wait to wait
+ * again). A thread cancelled in the wait releases the handle too.
+ * |*exit_code| is written only on success. */
 ZV_EXPORT zv_status zv_spawn_and_wait(char *const argv[], char *const envp[],
                                       int32_t *exit_code);
 

@@ -19,32 +19,55 @@ static void default_sink(void *context, int32_t level, uint32_t mask, const char
             file ? file : "?", (int)line, message);
 }
 
-/* The sink and its context change together: both are read and written under
- * one lock, which a delivery holds while the sink runs, so a sink that is
- * replaced finishes its message before the set returns. The lock is
- * recursive so that a sink may itself log or set a sink. */
+/* Deliveries and sink changes take turns under one lock, which a delivery
+ * holds while the sink runs, so a sink that is replaced finishes its message
+ * before the set returns. The lock is recursive so that a sink may itself log
+ * or set a sink. The sink and its context are published together: a set fills
+ * the slot not in use, then makes it current, so a fork at any moment leaves
+ * the child a whole binding. */
+struct binding {
+    zv_log_sink sink;
+    void *context;
+};
+static struct binding slots[2] = {{default_sink, NULL}, {default_sink, NULL}};
+static struct binding *current = &slots[0];
 static pthread_mutex_t binding_lock = PTHREAD_RECURSIVE_MUTEX_INITIALIZER_NP;
-static zv_log_sink current_sink = default_sink;
-static void *current_context;
+
+/* In a child of fork the lock may be held by a thread that does not exist
+ * there: the child starts with a free lock. */
+static void reset_lock_in_child(void)
+{
+    pthread_mutexattr_t recursive;
+    pthread_mutexattr_init(&recursive);
+    pthread_mutexattr_settype(&recursive, PTHREAD_MUTEX_RECURSIVE);
+    pthread_mutex_init(&binding_lock, &recursive);
+    pthread_mutexattr_destroy(&recursive);
+}
+
+__attribute__((constructor)) static void register_fork_handler(void)
+{
+    pthread_atfork(NULL, NULL, reset_lock_in_child);
+}
 
 ZV_LOG_EXPORT void zv_log_set_sink(zv_log_sink sink, void *context)
 {
     pthread_mutex_lock(&binding_lock);
-    current_sink = sink != NULL ? sink : default_sink;
-    current_context = sink != NULL ? context : NULL;
+    struct binding *next = current == &slots[0] ? &slots[1] : &slots[0];
+    next->sink = sink != NULL ? sink : default_sink;
+    next->context = sink != NULL ? context : NULL;
+    __atomic_store_n(&current, next, __ATOMIC_RELEASE);
     pthread_mutex_unlock(&binding_lock);
 }
 
-static void deliver(int32_t level, uint32_t mask, const char *function, const char *file,
-                    int32_t line, char *message, size_t length)
+/* Hands |message| to the current sink. A thread cancelled inside the sink
+ * would leave the lock held, so cancellation waits until it returns. */
+static void dispatch(int32_t level, uint32_t mask, const char *function, const char *file,
+                     int32_t line, const char *message)
 {
-    if (length > 0 && message[length - 1] == '\n')
-        message[length - 1] = '\0';
-    /* A thread cancelled inside the sink would leave the lock held. */
     int cancel_state;
     pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &cancel_state);
     pthread_mutex_lock(&binding_lock);
-    current_sink(current_context, level, mask, function, file, line, message);
+    current->sink(current->context, level, mask, function, file, line, message);
     pthread_mutex_unlock(&binding_lock);
     pthread_setcancelstate(cancel_state, NULL);
 }
@@ -75,7 +98,9 @@ ZV_LOG_EXPORT void zv_util_log_internal(int32_t level, uint32_t mask, const char
             n = (int)sizeof small - 1;
         }
     }
-    deliver(level, mask, function, file, line, text, (size_t)n);
+    if (n > 0 && text[n - 1] == '\n')
+        text[n - 1] = '\0';
+    dispatch(level, mask, function, file, line, text);
     if (text != small)
         free(text);
     errno = saved;
@@ -93,11 +118,7 @@ ZV_LOG_EXPORT void zv_util_log_internal_perror(int32_t errnum, int32_t level, ui
     size_t length = strlen(body);
     if (length > 0 && body[length - 1] == '\n')
         length--;
-    int n = snprintf(text, sizeof text, "%.*s: %s", (int)length, body, why);
-    if (n < 0)
-        n = 0;
-    if ((size_t)n >= sizeof text)
-        n = (int)sizeof text - 1;
-    deliver(level, mask, function, file, line, text, 0);
+    snprintf(text, sizeof text, "%.*s: %s", (int)length, body, why);
+    dispatch(level, mask, function, file, line, text);
     errno = saved;
 }

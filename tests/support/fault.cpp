@@ -6,6 +6,7 @@
 #include <dirent.h>
 #include <malloc.h>
 #include <signal.h>
+#include <sys/mman.h>
 #include <sys/time.h>
 
 #if defined(__SANITIZE_ADDRESS__)
@@ -118,6 +119,8 @@ WRAP(read, ssize_t, (int a, void *b, size_t c), "read", -1,
 WRAP(write, ssize_t, (int a, const void *b, size_t c), "write", -1,
      HIT("write_idle") ? 0 : __real_write(a, b, HIT("write_short") && c > 1 ? 1 : c))
 WRAP(fsync, int, (int a), "fsync", -1, __real_fsync(a))
+WRAP(mmap, void *, (void *a, size_t b, int c, int d, int e, off_t f), "mmap", MAP_FAILED,
+     __real_mmap(a, b, c, d, e, f))
 // "fstat_grown" reports a file 100 bytes larger than it is, as if it had
 // shrunk since it was measured.
 WRAP(fstat64, int, (int a, struct stat64 *b), "fstat", -1,
