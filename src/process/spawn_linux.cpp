@@ -46,8 +46,7 @@ namespace {
     return result;
 }
 
-template <class T>
-long arg(T *pointer)
+[[gnu::always_inline]] inline long arg(const void *pointer)
 {
     return reinterpret_cast<long>(pointer);
 }
