@@ -158,6 +158,7 @@ struct ChildStart {
 // (its checks and hooks are calls into a runtime) and no stack protector.
 #if defined(__clang__)
 #define ZV_CHILD_CODE [[gnu::noinline, clang::disable_sanitizer_instrumentation, \
+                        clang::no_sanitize("address", "thread", "undefined", "coverage"), \
                         clang::no_stack_protector]]
 #else
 #define ZV_CHILD_CODE [[gnu::noinline, gnu::no_sanitize("address", "thread", "undefined"), \
