@@ -46,7 +46,7 @@ build() {
     set +e
     (cd "$src" && dpkg-buildpackage -us -uc -b -a "$arch" 2>&1) | tee "$out/build.log" |
         grep --line-buffered -E '^[[:space:]]+dh_[a-z_]+|^\[[0-9]+/[0-9]+\]' |
-        sed -u -E 's/^[[:space:]]+/   /; s/^(\[[0-9]+\/[0-9]+\]).* -o ([^ ]+) .*/   \1 \2/'
+        sed -u -E 's/^[[:space:]]+/   /; s/^(\[[0-9]+\/[0-9]+\]).* -o ([^ ]+) .*/   \1 \2/; s/^(.{100}).*/\1 .../'
     local status=${PIPESTATUS[0]}
     set -e
     if [ "$status" -ne 0 ]; then
