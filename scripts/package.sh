@@ -2,8 +2,9 @@
 # scripts/package.sh [--twice] [amd64] [i386]
 # Builds the Debian packages of each architecture (default both) with
 #   dpkg-buildpackage -us -uc -b -a ARCH
-# from a copy of the tracked files in build/deb/ARCH/libzvutil-VERSION, so
-# that the .deb, .changes and .buildinfo files land in build/deb/ARCH, then
+# from a copy of the tracked files (staged once, as they are when it starts)
+# in build/deb/ARCH/libzvutil-VERSION, so that the .deb, .changes and
+# .buildinfo files land in build/deb/ARCH, then
 # runs lintian --pedantic on them (errors and warnings fail). Only the
 # Build-Depends of debian/control are installed to build. i386 is built on
 # amd64 with the multilib compilers (see debian/rules).
@@ -30,16 +31,20 @@ if [[ " ${archs[*]} " == *" i386 "* ]]; then
     scripts/deps.sh --only g++-multilib libc6:i386
 fi
 version=$(dpkg-parsechangelog -SVersion)
+staged=$root/build/deb/source
+rm -rf "$staged"
+mkdir -p "$staged"
+git ls-files -z --cached --others --exclude-standard |
+    while IFS= read -r -d '' file; do [ ! -e "$file" ] || printf '%s\0' "$file"; done |
+    xargs -0 cp -P --parents -t "$staged"
 
 # build ARCH DIR: the packages of ARCH in DIR, with the log in DIR/build.log.
 build() {
     local arch=$1 out=$2 start=$SECONDS
     local src=$out/libzvutil-$version
     rm -rf "$out"
-    mkdir -p "$src"
-    git ls-files -z --cached --others --exclude-standard |
-        while IFS= read -r -d '' file; do [ ! -e "$file" ] || printf '%s\0' "$file"; done |
-        xargs -0 cp -P --parents -t "$src"
+    mkdir -p "$out"
+    cp -a "$staged" "$src"
     (cd "$src" && dpkg-checkbuilddeps -a "$arch")
     echo "== dpkg-buildpackage -us -uc -b -a $arch in ${out#"$root"/}"
     # The progress: each debhelper step and ninja's count of targets.
