@@ -5,7 +5,8 @@
 # from a copy of the tracked files (staged once, as they are when it starts)
 # in build/deb/ARCH/libzvutil-VERSION, so that the .deb, .changes and
 # .buildinfo files land in build/deb/ARCH, then
-# runs lintian --pedantic on them (errors and warnings fail). Only the
+# runs lintian --pedantic on them and on the source package (errors and
+# warnings fail). Only the
 # Build-Depends of debian/control are installed to build. i386 is built on
 # amd64 with the multilib compilers (see debian/rules).
 # --twice builds each architecture again in another directory and fails
@@ -37,6 +38,12 @@ mkdir -p "$staged"
 git ls-files -z --cached --others --exclude-standard |
     while IFS= read -r -d '' file; do [ ! -e "$file" ] || printf '%s\0' "$file"; done |
     xargs -0 cp -P --parents -t "$staged"
+echo "== lintian --pedantic (source)"
+rm -rf "$root/build/deb/dsc" && mkdir -p "$root/build/deb/dsc"
+cp -a "$staged" "$root/build/deb/dsc/libzvutil-$version"
+(cd "$root/build/deb/dsc" && dpkg-source -b "libzvutil-$version" >/dev/null)
+lintian --pedantic --fail-on error,warning --display-info "$root/build/deb/dsc"/*.dsc
+echo "   no errors or warnings"
 
 # build ARCH DIR: the packages of ARCH in DIR, with the log in DIR/build.log.
 build() {
