@@ -4,9 +4,8 @@
 #   dpkg-buildpackage -us -uc -b -a ARCH
 # from a copy of the tracked files (staged once, as they are when it starts)
 # in build/deb/ARCH/libzvutil-VERSION, so that the .deb, .changes and
-# .buildinfo files land in build/deb/ARCH, then
-# runs lintian --pedantic on them and on the source package (errors and
-# warnings fail). Only the
+# .buildinfo files land in build/deb/ARCH, then runs lintian --pedantic on
+# them and on the source package (errors and warnings fail). Only the
 # Build-Depends of debian/control are installed to build. i386 is built on
 # amd64 with the multilib compilers (see debian/rules).
 # --twice builds each architecture again in another directory and fails
