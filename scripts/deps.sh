@@ -36,7 +36,8 @@ step() {
     fi
     local added
     added=$(grep -c '^Setting up ' "$log" || true)
-    echo "== $what: done in $((SECONDS - start)) s${added:+, $added packages set up}"
+    [ "$added" -gt 0 ] && added=", $added packages set up" || added=
+    echo "== $what: done in $((SECONDS - start)) s$added"
 }
 apt=($sudo env DEBIAN_FRONTEND=noninteractive apt-get -y -o DPkg::Lock::Timeout=600)
 
@@ -49,7 +50,8 @@ fi
 missing=()
 for package in "${packages[@]}"; do
     status=$(dpkg-query -W -f='${Status}' "$package" 2>/dev/null || true)
-    [ "$status" = "install ok installed" ] || missing+=("$package")
+    # A name without an architecture may list several (libgtest-dev).
+    [[ $status == *"ok installed"* ]] || missing+=("$package")
 done
 if [ -n "$build_dep" ] && ! (cd "$build_dep" && dpkg-checkbuilddeps) >/dev/null 2>&1; then
     build_dep_missing=yes
