@@ -4,8 +4,8 @@
 # abi.sh compare BASELINE SO
 #   Fails when SO breaks the interface recorded in BASELINE: a removed symbol,
 #   a changed parameter or return type, a changed record that a signature
-#   reaches. Added symbols are listed and allowed. Exits 77 (skipped) when SO
-#   carries no debug information.
+#   reaches. Added symbols are listed and allowed. Fails, saying why, when
+#   abigail-tools are missing or SO carries no debug information.
 # abi.sh policy "CC [FLAGS]" INCLUDE_DIR
 #   Builds a stub library from INCLUDE_DIR's headers in pairs, the second of
 #   each pair with one change, and checks that the comparison of compare
@@ -137,9 +137,16 @@ dump)
     ;;
 compare)
     baseline=$2 so=$3
-    if ! readelf -S "$so" | grep -q '\.debug_info'; then
+    for tool in abidw abidiff; do
+        command -v "$tool" >/dev/null ||
+            { echo "$tool is not installed (scripts/deps.sh installs abigail-tools)"; exit 1; }
+    done
+    # grep reads the whole listing: with -q it could leave readelf to die of
+    # SIGPIPE, which pipefail would report as a missing section.
+    sections=$(readelf -S "$so") || exit 1
+    if ! grep '\.debug_info' <<<"$sections" >/dev/null; then
         echo "$so has no debug information: the comparison needs a -g build"
-        exit 77
+        exit 1
     fi
     dump "$so" "$work/new.abi"
     status=0

@@ -63,8 +63,14 @@ int main(int argc, char **argv)
     zv_util_snprintf_human_time(duration, sizeof duration, 7200.0);
     printf("zv_util_snprintf_human_time(7200) -> \"%s\"\n", duration);
 
+    /* A file that does not exist: the call is meant to fail, and its trace
+     * shows where. */
     status = zv_util_read_named_file("build/demo/no-such-file", &back, &size, NULL);
-    printf("zv_util_read_named_file(missing) -> %u, trace (deepest first):\n", (unsigned)status);
+    printf("zv_util_read_named_file(\"build/demo/no-such-file\") -> %u: %s;\n"
+           "   its trace, deepest frame first:\n",
+           (unsigned)status,
+           status == ZV_ERR_SYSTEM ? "the expected failure, as the file does not exist"
+                                   : "NOT the expected ZV_ERR_SYSTEM");
     show_trace();
     return 0;
 }

@@ -11,7 +11,8 @@ seconds=${1:-5}
 scripts/deps.sh
 
 cmake --preset fuzz >/dev/null
-cmake --build --preset fuzz >/dev/null
+cmake --build --preset fuzz 2>&1 | scripts/progress.sh build/fuzz.build.log ||
+    { tail -40 build/fuzz.build.log; exit 1; }
 mkdir -p build/fuzz/crashes
 failed=()
 for source in fuzz/*.cpp; do

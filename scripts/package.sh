@@ -1,94 +1,86 @@
 #!/usr/bin/env bash
-# scripts/package.sh [i386|amd64]
-# Builds the Debian packages for one architecture (default i386) into
-# build/packages/ and runs lintian on them:
-#   libzvutil1, libzverrortrace1, libzvlog1  the shared objects
-#   libzvutil-dev  headers, .so links, pkg-config files, CMake package, manual pages
-# Files go to the multiarch directory /usr/lib/<triplet>. The package metadata
-# (control, changelog, copyright) lives in packaging/deb/.
+# scripts/package.sh [--twice] [amd64] [i386]
+# Builds the Debian packages of each architecture (default both) with
+#   dpkg-buildpackage -us -uc -b -a ARCH
+# from a copy of the tracked files (staged once, as they are when it starts)
+# in build/deb/ARCH/libzvutil-VERSION, so that the .deb, .changes and
+# .buildinfo files land in build/deb/ARCH, then runs lintian --pedantic on
+# them and on the source package (errors and warnings fail). Only the
+# Build-Depends of debian/control are installed to build. i386 is built on
+# amd64 with the multilib compilers (see debian/rules).
+# --twice builds each architecture again in another directory and fails
+# unless every .deb is byte-identical to the first build's.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 root=$PWD
-arch=${1:-i386}
-case $arch in
-i386) toolchain=(--toolchain "$root/cmake/i386-linux-gnu.cmake") ;;
-amd64) toolchain=() ;;
-*) echo "usage: $0 [i386|amd64]" >&2; exit 2 ;;
-esac
-scripts/deps.sh dpkg-dev lintian "libc6:$arch"
-
-# The dpkg tools below work for the DEB_HOST_* architecture they find in the
-# environment; file times in the packages are those of the changelog entry.
-eval "$(dpkg-architecture -a"$arch" -s 2>/dev/null)"
-SOURCE_DATE_EPOCH=$(dpkg-parsechangelog -l packaging/deb/changelog -STimestamp)
-export SOURCE_DATE_EPOCH
-version=$(dpkg-parsechangelog -l packaging/deb/changelog -SVersion)
-libdir=usr/lib/$DEB_HOST_MULTIARCH
-
-build=$root/build/deb-$arch
-out=$root/build/packages
-echo "== building for $arch ($libdir)"
-cmake -S . -B "$build" -G Ninja "${toolchain[@]}" -DCMAKE_BUILD_TYPE=RelWithDebInfo \
-    -DZV_BUILD_TESTS=OFF -DCMAKE_INSTALL_PREFIX=/usr -DCMAKE_INSTALL_LIBDIR="lib/$DEB_HOST_MULTIARCH" \
-    -DZV_RELOCATABLE_PKGCONFIG=OFF -DCMAKE_SKIP_INSTALL_RPATH=ON \
-    -DCMAKE_SHARED_LINKER_FLAGS="-Wl,-z,relro -Wl,-z,now" >/dev/null
-cmake --build "$build" --target zvutil zverrortrace zvlog -- -j2 >/dev/null
-
-# A source-package layout, as the dpkg tools expect: debian/control,
-# debian/changelog and one tree per package in debian/<package>.
-work=$build/pkg
-rm -rf "$work"
-mkdir -p "$work/debian" "$out"
-cp packaging/deb/control packaging/deb/changelog "$work/debian/"
-runtime=(libzvutil1:zvutil libzverrortrace1:zverrortrace libzvlog1:zvlog)
-for entry in "${runtime[@]}" libzvutil-dev:development; do
-    package=${entry%%:*} component=${entry#*:}
-    tree=$work/debian/$package
-    DESTDIR=$tree cmake --install "$build" --component "$component" >/dev/null
-    mkdir -p "$tree/DEBIAN" "$tree/usr/share/doc/$package"
-    install -m 644 packaging/deb/copyright "$tree/usr/share/doc/$package/"
-    gzip -9nc packaging/deb/changelog > "$tree/usr/share/doc/$package/changelog.gz"
+twice=no
+if [ "${1:-}" = --twice ]; then twice=yes; shift; fi
+archs=("$@")
+[ ${#archs[@]} -gt 0 ] || archs=(amd64 i386)
+for arch in "${archs[@]}"; do
+    case $arch in
+    amd64 | i386) ;;
+    *) echo "usage: $0 [--twice] [amd64] [i386]" >&2; exit 2 ;;
+    esac
 done
 
-# Manual pages compressed, each link re-pointed at its compressed page.
-man=$work/debian/libzvutil-dev/usr/share/man
-find "$man" -type f -name '*.[0-9]' -exec gzip -9n {} +
-find "$man" -type l -name '*.[0-9]' | while read -r link; do
-    ln -s "$(readlink "$link").gz" "$link.gz"
-    rm "$link"
-done
+scripts/deps.sh --only dpkg-dev lintian
+scripts/deps.sh --build-dep "$root"
+# The i386 line of Build-Depends, which a native build does not install.
+if [[ " ${archs[*]} " == *" i386 "* ]]; then
+    scripts/deps.sh --only g++-multilib libc6:i386
+fi
+version=$(dpkg-parsechangelog -SVersion)
+staged=$root/build/deb/source
+rm -rf "$staged"
+mkdir -p "$staged"
+git ls-files -z --cached --others --exclude-standard |
+    while IFS= read -r -d '' file; do [ ! -e "$file" ] || printf '%s\0' "$file"; done |
+    xargs -0 cp -P --parents -t "$staged"
+echo "== lintian --pedantic (source)"
+rm -rf "$root/build/deb/dsc" && mkdir -p "$root/build/deb/dsc"
+cp -a "$staged" "$root/build/deb/dsc/libzvutil-$version"
+(cd "$root/build/deb/dsc" && dpkg-source -b "libzvutil-$version" >/dev/null)
+lintian --pedantic --fail-on error,warning --display-info "$root/build/deb/dsc"/*.dsc
+echo "   no errors or warnings"
 
-cd "$work"
-for entry in "${runtime[@]}"; do
-    package=${entry%%:*} lib=lib${entry#*:}
-    tree=debian/$package
-    object=$(readlink -f "$tree/$libdir/$lib.so.1")
-    strip --remove-section=.comment --remove-section=.note --strip-unneeded "$object"
-    chmod 644 "$object"
-    echo "$lib 1 $package (>= $version)" > "$tree/DEBIAN/shlibs"
-    echo "activate-noawait ldconfig" > "$tree/DEBIAN/triggers"
-    dpkg-gensymbols -q -p"$package" -P"$tree" -e"$object" -v"$version" -c0 \
-        -O"$tree/DEBIAN/symbols"
-    sed -i '1a * Build-Depends-Package: libzvutil-dev' "$tree/DEBIAN/symbols"
-done
-for entry in "${runtime[@]}" libzvutil-dev:development; do
-    package=${entry%%:*}
-    tree=debian/$package
-    : > "debian/$package.substvars"
-    if [ "$package" != libzvutil-dev ]; then
-        dpkg-shlibdeps -T"debian/$package.substvars" -l"$PWD/debian/libzverrortrace1/$libdir" \
-            -l"$PWD/debian/libzvlog1/$libdir" "$tree/$libdir"/*.so.*.*.*
+# build ARCH DIR: the packages of ARCH in DIR, with the log in DIR/build.log.
+build() {
+    local arch=$1 out=$2 start=$SECONDS
+    local src=$out/libzvutil-$version
+    rm -rf "$out"
+    mkdir -p "$out"
+    cp -a "$staged" "$src"
+    (cd "$src" && dpkg-checkbuilddeps -a "$arch")
+    echo "== dpkg-buildpackage -us -uc -b -a $arch in ${out#"$root"/}"
+    # The progress: each debhelper step and ninja's count of targets.
+    set +e
+    (cd "$src" && dpkg-buildpackage -us -uc -b -a "$arch" 2>&1) | tee "$out/build.log" |
+        grep --line-buffered -E '^[[:space:]]+dh_[a-z_]+|^\[[0-9]+/[0-9]+\]' |
+        sed -u -E 's/^[[:space:]]+/   /; s/^(\[[0-9]+\/[0-9]+\]).* -o ([^ ]+) .*/   \1 \2/; s/^(.{100}).*/\1 .../'
+    local status=${PIPESTATUS[0]}
+    set -e
+    if [ "$status" -ne 0 ]; then
+        echo "dpkg-buildpackage failed; the end of $out/build.log:"
+        tail -40 "$out/build.log"
+        exit 1
     fi
-    dpkg-gencontrol -p"$package" -P"$tree" -T"debian/$package.substvars"
-    (cd "$tree" && find . -path ./DEBIAN -prune -o -type f -printf '%P\0' |
-        LC_ALL=C sort -z | xargs -0 -r md5sum > DEBIAN/md5sums)
-    find "$tree" -type d -exec chmod 755 {} +
-    find "$tree" -type f -exec chmod 644 {} +
-    dpkg-deb --root-owner-group -Zxz --build "$tree" "$out" | sed 's/^dpkg-deb: /   /'
-done
+    echo "   built in $((SECONDS - start)) s:"
+    (cd "$out" && ls -1 ./*.deb | sed 's|^\./|   |')
+}
 
-echo "== lintian"
-cd "$out"
-debs=(*_"$version"_"$arch".deb)
-lintian --fail-on error --display-info "${debs[@]}"
-echo "lintian reports no errors"
+for arch in "${archs[@]}"; do
+    out=$root/build/deb/$arch
+    build "$arch" "$out"
+    echo "== lintian --pedantic ($arch)"
+    lintian --pedantic --fail-on error,warning --display-info "$out"/*_"$arch".changes
+    echo "   no errors or warnings"
+    if [ $twice = yes ]; then
+        build "$arch" "$root/build/deb/$arch-again"
+        for deb in "$out"/*.deb; do
+            cmp "$deb" "$root/build/deb/$arch-again/${deb##*/}" ||
+                { echo "${deb##*/} differs between the two builds"; exit 1; }
+        done
+        echo "== every .deb of the two $arch builds is byte-identical"
+    fi
+done

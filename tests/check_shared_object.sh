@@ -2,7 +2,7 @@
 # check_shared_object.sh exports SO LIST HEADER_DIR
 #   SO exports only names in LIST, and every name of LIST that a header in
 #   HEADER_DIR declares; the shared list beside the repository, when present,
-#   matches LIST.
+#   matches LIST. Every export carries the version node ZVUTIL_1.0.
 # check_shared_object.sh needed SO
 #   SO has SONAME libzvutil.so.1, needs only the sibling libraries, librt and
 #   libc, and references nothing of the C++ runtime.
@@ -13,8 +13,10 @@ fail=0
 case $mode in
 exports)
     list=$3 headers=$4
-    exported=$(nm -D --defined-only "$so" | awk '$2 ~ /^[A-Za-z]$/ {print $3}' | sed 's/@.*//' |
-        sort -u)
+    symbols=$(nm -D --defined-only "$so" | awk '$2 ~ /^[B-Za-z]$/ {print $3}')
+    exported=$(echo "$symbols" | sed 's/@.*//' | sort -u)
+    unversioned=$(echo "$symbols" | grep -v '@@ZVUTIL_1\.0$' || true)
+    if [ -n "$unversioned" ]; then echo "not in ZVUTIL_1.0:"; echo "$unversioned"; fail=1; fi
     extra=$(comm -23 <(echo "$exported") <(sort -u "$list"))
     if [ -n "$extra" ]; then echo "exported but not public:"; echo "$extra"; fail=1; fi
     declared=$(grep -ohwE "$(paste -sd'|' "$list")" "$headers"/*.h | sort -u)
