@@ -10,9 +10,10 @@
 
 namespace zv::base64 {
 
-// Encodes whole 12-byte (SSSE3), 24-byte (AVX2) or 48-byte (AVX-512 VBMI)
-// blocks of the |n| bytes at |in|, 16 characters per 12 bytes, and returns the
-// bytes consumed (a multiple of 12; 0 below 16 bytes).
+// Encodes whole 12-byte (SSSE3) or 24-byte (AVX2) blocks of the |n| bytes at
+// |in|, 16 characters per 12 bytes, and returns the bytes consumed (a multiple
+// of 12; 0 below 16 bytes). The AVX-512 VBMI kernel takes every whole 3-byte
+// group.
 ZV_INTERNAL size_t encode_ssse3(const uint8_t *in, size_t n, char *out);
 ZV_INTERNAL size_t encode_avx2(const uint8_t *in, size_t n, char *out);
 ZV_INTERNAL size_t encode_avx512vbmi(const uint8_t *in, size_t n, char *out);  // 64-bit only

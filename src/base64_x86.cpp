@@ -137,10 +137,10 @@ constexpr __mmask64 kLow48 = (__mmask64{1} << 48) - 1;
 // undefined and then warn about it: the full-mask forms are the same code.
 constexpr __mmask64 kAll = ~__mmask64{0};
 
-ZV_TARGET(ZV_AVX512VBMI) inline __m512i encode_block(const uint8_t *in)
+// The characters of the 16 groups in the low 48 bytes of |bytes|.
+ZV_TARGET(ZV_AVX512VBMI) inline __m512i encode_block(__m512i bytes)
 {
-    __m512i words = _mm512_maskz_permutexvar_epi8(kAll, _mm512_loadu_si512(kSpread.data()),
-                                                  _mm512_maskz_loadu_epi8(kLow48, in));
+    __m512i words = _mm512_maskz_permutexvar_epi8(kAll, _mm512_loadu_si512(kSpread.data()), bytes);
     __m512i values =
         _mm512_maskz_multishift_epi64_epi8(kAll, _mm512_set1_epi64(kValueShifts), words);
     // The permute reads the low six bits of each index.
@@ -237,8 +237,14 @@ ZV_TARGET(ZV_AVX512VBMI) size_t encode_avx512vbmi(const uint8_t *in, size_t n, c
 {
     size_t i = 0;
     for (; n - i >= 48; i += 48, out += 64)
-        _mm512_storeu_si512(out, encode_block(in + i));
-    return i + encode_avx2(in + i, n - i, out);
+        _mm512_storeu_si512(out, encode_block(_mm512_maskz_loadu_epi8(kLow48, in + i)));
+    // The last whole groups, fewer than 16, under masks.
+    const size_t groups = (n - i) / 3;
+    if (groups != 0) {
+        __m512i bytes = _mm512_maskz_loadu_epi8((__mmask64{1} << 3 * groups) - 1, in + i);
+        _mm512_mask_storeu_epi8(out, (__mmask64{1} << 4 * groups) - 1, encode_block(bytes));
+    }
+    return i + 3 * groups;
 }
 
 ZV_TARGET(ZV_AVX512VBMI)
