@@ -157,8 +157,9 @@ __attribute__((target("avx2"))) void fill_avx2_nt(zv_util_prng_state &state,
 #pragma GCC unroll 16
         for (int i = 0; i < 64; i += 4, at += 32) {
             __m256i t = _mm256_loadu_si256(reinterpret_cast<const __m256i *>(pool + i));
+            const auto *lag = reinterpret_cast<const __m256i *>(pool + i + 11);
             __m256i v = i == 52 ? _mm256_setr_epi64x(pool[63], pool[0], pool[1], pool[2])
-                                : _mm256_loadu_si256(reinterpret_cast<const __m256i *>(pool + i + 11));
+                                : _mm256_loadu_si256(lag);
             t = _mm256_xor_si256(t, _mm256_slli_epi64(t, 33));
             t = _mm256_xor_si256(t, _mm256_srli_epi64(t, 26));
             v = _mm256_xor_si256(v, _mm256_slli_epi64(v, 27));

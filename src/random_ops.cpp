@@ -160,8 +160,8 @@ ZV_TARGET("avx512f") void run_rounds_avx512(uint64_t *pool, Lanes<8> &weyl, unsi
 #pragma GCC unroll 8
         for (int g = 0; g < 8; ++g) {
             // The full mask keeps GCC 12 from warning about an undefined source.
-            Lanes<8> t = words[g], v = (Lanes<8>)_mm512_maskz_alignr_epi64(
-                                       0xff, (__m512i)words[(g + 2) & 7], (__m512i)words[(g + 1) & 7], 3);
+            const auto high = (__m512i)words[(g + 2) & 7], low = (__m512i)words[(g + 1) & 7];
+            Lanes<8> t = words[g], v = (Lanes<8>)_mm512_maskz_alignr_epi64(0xff, high, low, 3);
             t ^= t << 33;
             t ^= t >> 26;
             v ^= v << 27;
@@ -180,7 +180,8 @@ ZV_TARGET("avx512f") void run_rounds_avx512(uint64_t *pool, Lanes<8> &weyl, unsi
 #endif
 
 // Runs |groups| groups a round at a time. Streamed rounds go through a
-// buffer in the cache, from which whole lines leave in one burst.
+// buffer in the cache, from which whole lines leave in one burst; eight
+// lanes run their whole rounds in registers first, storing each line as made.
 template <int N>
 [[gnu::always_inline]] inline void run_groups(uint64_t *pool, Lanes<N> &weyl, unsigned char *dest,
                                               uint32_t groups, bool stream)
