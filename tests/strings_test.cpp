@@ -19,16 +19,17 @@ bool holds(void *block, size_t bytes) { return malloc_usable_size(block) >= byte
 
 constexpr char kAlphabet[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
 
-// |code| run on a copy of |in| followed by |pad| alphabet characters, which
-// change the output of a read past |in|; without them such reads show under the
-// sanitizer. Returns the output, after checking that the output block holds it.
+// |code| run on a copy of |in| that 64 alphabet characters precede and |pad|
+// follow, which change the output of a read outside |in|; without those after
+// it, a read past the end shows under the sanitizer. Returns the output, after
+// checking that the output block holds it.
 template <class Out, class Code>
 std::string coded(Code code, const std::string &in, size_t pad)
 {
-    std::string block = in + std::string(pad, 'A');
+    std::string block = std::string(64, 'A') + in + std::string(pad, 'A');
     Out *out = nullptr;
     uint32_t n = 0;
-    EXPECT_EQ(code(block.data(), static_cast<uint32_t>(in.size()), &out, &n), ZV_OK);
+    EXPECT_EQ(code(block.data() + 64, static_cast<uint32_t>(in.size()), &out, &n), ZV_OK);
     std::string result(reinterpret_cast<char *>(out), n);
     EXPECT_TRUE(holds(out, n));
     std::free(out);
