@@ -1,6 +1,6 @@
 // Shared by the fuzz targets: failed checks abort. Targets of a kernel with
-// vector paths run each input on the paths of the first size % 4 processor
-// features: none, SSE2, SSSE3 too, AVX2 too.
+// vector paths run each input on the paths of the first size % 5 processor
+// features: none, SSE2, SSSE3 too, AVX2 too, AVX-512 VBMI too (64-bit only).
 #pragma once
 
 #include <cstdlib>

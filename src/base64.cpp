@@ -79,7 +79,13 @@ void encode_groups(const uint8_t *bytes, size_t whole, char *text)
 {
     size_t i = 0;
     if (whole >= 16) {
+#ifdef __x86_64__
+        if (zv::cpu::has(zv::cpu::kAVX512VBMI))
+            i = zv::base64::encode_avx512vbmi(bytes, whole, text);
+        else if (zv::cpu::has(zv::cpu::kAVX2))
+#else
         if (zv::cpu::has(zv::cpu::kAVX2))
+#endif
             i = zv::base64::encode_avx2(bytes, whole, text);
         else if (zv::cpu::has(zv::cpu::kSSSE3))
             i = zv::base64::encode_ssse3(bytes, whole, text);
@@ -101,6 +107,10 @@ using DecodeKernel = size_t (*)(const unsigned char *, size_t, uint8_t *, size_t
 
 DecodeKernel decode_kernel()
 {
+#ifdef __x86_64__
+    if (zv::cpu::has(zv::cpu::kAVX512VBMI))
+        return zv::base64::decode_avx512vbmi;
+#endif
     if (zv::cpu::has(zv::cpu::kAVX2))
         return zv::base64::decode_avx2;
     if (zv::cpu::has(zv::cpu::kSSSE3))

@@ -14,7 +14,8 @@ constinit std::atomic<uint32_t> allowed{~0u};
 
 uint32_t detect()
 {
-    // libgcc's detection also checks that the kernel saves the AVX state.
+    // libgcc's detection also checks that the kernel saves the AVX and
+    // AVX-512 state.
     __builtin_cpu_init();
     uint32_t found = 0;
     if (__builtin_cpu_supports("sse2"))
@@ -23,6 +24,11 @@ uint32_t detect()
         found |= kSSSE3;
     if (__builtin_cpu_supports("avx2"))
         found |= kAVX2;
+#ifdef __x86_64__
+    if (__builtin_cpu_supports("avx512f") && __builtin_cpu_supports("avx512bw") &&
+        __builtin_cpu_supports("avx512vbmi"))
+        found |= kAVX512VBMI;
+#endif
     return found;
 }
 

@@ -17,6 +17,8 @@ enum : uint32_t {
     kSSE2 = 1u << 0,
     kSSSE3 = 1u << 1,
     kAVX2 = 1u << 2,
+    // AVX-512 F, BW and VBMI together; only the 64-bit build has these paths.
+    kAVX512VBMI = 1u << 3,
 };
 
 // The usable features: what the processor and the kernel support, less any

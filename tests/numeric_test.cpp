@@ -22,7 +22,12 @@ TEST(Hash64, KnownValuesOnEveryPathAndFeatures)
     // Detection agrees with the compiler's; restrict() hides features until lifted.
     const uint32_t all = (__builtin_cpu_supports("sse2") ? uint32_t{zv::cpu::kSSE2} : 0) |
                          (__builtin_cpu_supports("ssse3") ? uint32_t{zv::cpu::kSSSE3} : 0) |
-                         (__builtin_cpu_supports("avx2") ? uint32_t{zv::cpu::kAVX2} : 0);
+                         (__builtin_cpu_supports("avx2") ? uint32_t{zv::cpu::kAVX2} : 0) |
+                         (sizeof(void *) == 8 && __builtin_cpu_supports("avx512f") &&
+                                  __builtin_cpu_supports("avx512bw") &&
+                                  __builtin_cpu_supports("avx512vbmi")
+                              ? uint32_t{zv::cpu::kAVX512VBMI}
+                              : 0);
     zvt::for_each_feature_path([&](uint32_t paths) {
         EXPECT_EQ(zv::cpu::features(), all & paths);
         for (const auto &[length, expected] : rows)
@@ -38,6 +43,20 @@ TEST(Hash64, KnownValuesOnEveryPathAndFeatures)
     zvt::expect_failures({ROW(ZV_ERR_BAD_VALUE, hash64, (nullptr, 1, &hash)),
                           ROW(ZV_ERR_BAD_VALUE, hash64, ("a", 0, &hash))});
     EXPECT_TRUE(hash == 42 && zv::cpu::features() == all);
+}
+
+// A vector path the processor cannot run is tested by no other test either.
+TEST(Cpu, EveryVectorPathRuns)
+{
+    using namespace zv::cpu;
+    std::string missing;
+    const std::pair<uint32_t, const char *> paths[] = {
+        {kSSE2, " SSE2"}, {kSSSE3, " SSSE3"}, {kAVX2, " AVX2"}, {kAVX512VBMI, " AVX-512 VBMI"}};
+    for (const auto &[feature, name] : paths)  // the i386 build has no AVX-512 paths
+        if (!has(feature) && (feature != kAVX512VBMI || sizeof(void *) == 8))
+            missing += name;
+    if (!missing.empty())
+        GTEST_SKIP() << "paths not run, the processor lacks:" << missing;
 }
 
 TEST(Prng, KnownSequencesFillsAndFailures)

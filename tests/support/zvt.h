@@ -36,11 +36,13 @@
 namespace zvt {
 
 // Runs |check| once per processor path of the vector kernels: everything
-// detected, SSSE3 and below, SSE2 only, and the plain scalar code.
+// detected, AVX2 and below, SSSE3 and below, SSE2 only, and the plain scalar
+// code. Cpu.EveryVectorPathRuns reports the paths the processor lacks.
 template <typename Check>
 void for_each_feature_path(Check check)
 {
-    for (uint32_t mask : {~0u, zv::cpu::kSSE2 | zv::cpu::kSSSE3, +zv::cpu::kSSE2, 0u}) {
+    using namespace zv::cpu;
+    for (uint32_t mask : {~0u, kSSE2 | kSSSE3 | kAVX2, kSSE2 | kSSSE3, +kSSE2, 0u}) {
         zv::cpu::restrict(mask);
         check(mask);
     }
