@@ -18,16 +18,16 @@ ZV_EXPORT zv_status zv_util_fopen(FILE **stream_out, int32_t *errno_out, const c
 {
     if (stream_out == nullptr || mode == nullptr || format == nullptr)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
-    FILE *stream = nullptr;
+    zv::unique_malloc<char> path;
     va_list args;
     va_start(args, format);
-    zv::OpenedPath opened = zv::open_formatted(format, args, errno_out, [&](const char *path) {
-        stream = zv::zv_util_open_stream(path, mode);
-        return stream != nullptr;
-    });
+    zv_status status = zv_util_vasprintf(zv::out_block(path), format, args, errno_out);
     va_end(args);
-    if (opened.status != ZV_OK)
-        return ZV_FAIL(opened.status);
+    if (status != ZV_OK)
+        return ZV_FAIL(status);
+    FILE *stream = zv::zv_util_open_stream(path.get(), mode);
+    if (stream == nullptr)
+        return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
     *stream_out = stream;
     return ZV_OK;
 }

@@ -83,18 +83,17 @@ ZV_EXPORT zv_status zv_util_open(int32_t *fd_out, int32_t *errno_out, int32_t fl
 {
     if (fd_out == nullptr || format == nullptr)
         return ZV_FAIL(ZV_ERR_NULL_ARG);
+    zv::unique_malloc<char> path;
     va_list args;
     va_start(args, format);
-    // Always the three-argument form; the flags go through untouched.
-    zv::OpenedPath opened = zv::open_formatted(format, args, errno_out, [&](const char *path) {
-        *fd_out = ::open(path, flags, static_cast<mode_t>(mode));
-        return *fd_out >= 0;
-    });
+    zv_status status = zv_util_vasprintf(zv::out_block(path), format, args, errno_out);
     va_end(args);
-    if (!opened.formatted)
-        return opened.status;  // the formatter has recorded the frame
-    if (opened.status != ZV_OK)
-        return ZV_FAIL(opened.status);
+    if (status != ZV_OK)
+        return status;  // the formatter has recorded the frame
+    // Always the three-argument form; the flags go through untouched.
+    *fd_out = ::open(path.get(), flags, static_cast<mode_t>(mode));
+    if (*fd_out < 0)
+        return ZV_ERRNO_FAIL(ZV_ERR_SYSTEM, errno_out);
     return ZV_OK;
 }
 
