@@ -92,8 +92,14 @@ OutBlock<T> out_block(unique_malloc<T> &owner)
     return OutBlock<T>(owner);
 }
 
+// Closing on the way out keeps errno as the failure left it, as unique_fd does.
 struct FileCloser {
-    void operator()(FILE *stream) const noexcept { std::fclose(stream); }
+    void operator()(FILE *stream) const noexcept
+    {
+        int saved = errno;
+        std::fclose(stream);
+        errno = saved;
+    }
 };
 using unique_file = std::unique_ptr<FILE, FileCloser>;
 

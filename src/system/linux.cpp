@@ -146,10 +146,9 @@ zv_status zv::zv_util_proc_stat(zv_proc_stat *ret_proc_stat, const char *path)
     size_t capacity = 0;
     errno = 0;  // an empty file leaves errno alone: do not report a stale one
     ssize_t n = getline(zv::out_block(line), &capacity, stream.get());
-    int saved_errno = errno;
     stream.reset();
     if (n == -1)
-        return ZV_PERROR_FAIL(saved_errno, ZV_ERR_IO, "getline() failed\n");
+        return ZV_PERROR_FAIL(errno, ZV_ERR_IO, "getline() failed\n");
 
     // The bound takes in the NUL after the line, which ends its last field.
     // Fields are split in place at single spaces; the command name runs to
