@@ -30,13 +30,7 @@ constexpr auto kPairs = [] {
 // The 6-bit value of each character; kSkip marks every character outside the
 // alphabet, '=' included.
 constexpr uint8_t kSkip = 0x80;
-constexpr auto kValues = [] {
-    std::array<uint8_t, 256> values{};
-    values.fill(kSkip);
-    for (uint8_t v = 0; v < 64; v++)
-        values[static_cast<unsigned char>(kAlphabet[v])] = v;
-    return values;
-}();
+constexpr auto kValues = zv::inverse_table(kAlphabet, 64, kSkip);
 
 // For each position in a quad, each character's bits already in place in the
 // three output bytes (bytes 0..2 of the word in memory order), so a quad is the

@@ -11,12 +11,14 @@
 #include <zvlog.h>
 #include <zvutil/status.h>
 
+#include <array>
 #include <cerrno>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
+#include <string_view>
 #include <unistd.h>
 
 #define ZV_INTERNAL __attribute__((visibility("hidden")))
@@ -52,6 +54,19 @@ inline char *copy_text(const char *text, size_t length)
         copy[length] = '\0';
     }
     return copy;
+}
+
+// A lookup of the bytes of |alphabet|: each one's position in it, counted
+// modulo |period| so that repeated runs (the two cases of the hexadecimal
+// digits) share their values; |absent| for every other byte.
+constexpr std::array<uint8_t, 256> inverse_table(std::string_view alphabet, size_t period,
+                                                 uint8_t absent)
+{
+    std::array<uint8_t, 256> values{};
+    values.fill(absent);
+    for (size_t i = 0; i < alphabet.size(); i++)
+        values[static_cast<unsigned char>(alphabet[i])] = static_cast<uint8_t>(i % period);
+    return values;
 }
 
 // Releases |count| heap blocks (last first) and the heap array that holds

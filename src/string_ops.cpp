@@ -48,17 +48,7 @@ zv_status measure_join(const char *const *strings, uint32_t count, size_t m, uin
 
 // Nibble value of each hexadecimal digit; kNotHex for every other character.
 constexpr uint8_t kNotHex = 0x80;
-constexpr auto kNibbles = [] {
-    std::array<uint8_t, 256> nibbles{};
-    nibbles.fill(kNotHex);
-    for (uint8_t v = 0; v < 10; v++)
-        nibbles['0' + v] = v;
-    for (uint8_t v = 0; v < 6; v++) {
-        nibbles['a' + v] = static_cast<uint8_t>(10 + v);
-        nibbles['A' + v] = static_cast<uint8_t>(10 + v);
-    }
-    return nibbles;
-}();
+constexpr auto kNibbles = zv::inverse_table("0123456789abcdef0123456789ABCDEF", 16, kNotHex);
 
 }  // namespace
 
