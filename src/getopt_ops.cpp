@@ -62,6 +62,20 @@ zv_status process_option(const zv_util_option *record, char *const argv[], int32
     return ZV_OK;
 }
 
+// The checks every handler opens with: ZV_ERR_NULL_ARG for a missing record,
+// destination or |consumed|, or a missing |value| where one is wanted;
+// ZV_ERR_BAD_VALUE for a value longer than kMaxValueLength. Records no frame.
+zv_status check_handler_args(const zv_util_option *record, const char *value,
+                             const uint32_t *consumed, bool wants_value)
+{
+    if (record == nullptr || (wants_value && value == nullptr) || consumed == nullptr ||
+        record->destination == nullptr)
+        return ZV_ERR_NULL_ARG;
+    if (wants_value && zv_util_strnlen(value, kMaxValueLength + 1) > kMaxValueLength)
+        return ZV_ERR_BAD_VALUE;
+    return ZV_OK;
+}
+
 }  // namespace
 
 extern "C" {
@@ -101,16 +115,12 @@ ZV_EXPORT zv_status zv_util_getopt_from(int32_t argc, char *const argv[],
 ZV_EXPORT zv_status zv_util_getopt_string(const zv_util_option *record, const char *value,
                                           uint32_t *consumed)
 {
-    if (record == nullptr || value == nullptr || consumed == nullptr ||
-        record->destination == nullptr)
-        return ZV_FAIL(ZV_ERR_NULL_ARG);
+    if (zv_status status = check_handler_args(record, value, consumed, true); status != ZV_OK)
+        return ZV_FAIL(status);
     auto *destination = static_cast<char **>(record->destination);
     if (*destination != nullptr)
         return ZV_FAIL(ZV_ERR_BAD_VALUE);
-    const uint32_t length = zv_util_strnlen(value, kMaxValueLength + 1);
-    if (length > kMaxValueLength)
-        return ZV_FAIL(ZV_ERR_BAD_VALUE);
-    char *copy = zv::copy_text(value, length);
+    char *copy = zv::copy_text(value, std::strlen(value));
     if (copy == nullptr)
         return ZV_FAIL(ZV_ERR_NO_MEMORY);
     *destination = copy;
@@ -121,11 +131,8 @@ ZV_EXPORT zv_status zv_util_getopt_string(const zv_util_option *record, const ch
 ZV_EXPORT zv_status zv_util_getopt_int(const zv_util_option *record, const char *value,
                                        uint32_t *consumed)
 {
-    if (record == nullptr || value == nullptr || consumed == nullptr ||
-        record->destination == nullptr)
-        return ZV_FAIL(ZV_ERR_NULL_ARG);
-    if (zv_util_strnlen(value, kMaxValueLength + 1) > kMaxValueLength)
-        return ZV_FAIL(ZV_ERR_BAD_VALUE);
+    if (zv_status status = check_handler_args(record, value, consumed, true); status != ZV_OK)
+        return ZV_FAIL(status);
     // Accepts what "%d" accepts (leading space, a sign, anything after the
     // digits), but a number out of range is refused rather than wrapped.
     char *end = nullptr;
@@ -144,9 +151,8 @@ ZV_EXPORT zv_status zv_util_getopt_int(const zv_util_option *record, const char 
 ZV_EXPORT zv_status zv_util_getopt_flag(const zv_util_option *record, const char *value,
                                         uint32_t *consumed)
 {
-    (void)value;
-    if (record == nullptr || consumed == nullptr || record->destination == nullptr)
-        return ZV_FAIL(ZV_ERR_NULL_ARG);
+    if (zv_status status = check_handler_args(record, value, consumed, false); status != ZV_OK)
+        return ZV_FAIL(status);
     if (record->takes_value != 0)
         return ZV_FAIL(ZV_ERR_BAD_VALUE);
     *static_cast<int32_t *>(record->destination) = 1;
