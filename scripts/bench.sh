@@ -14,7 +14,8 @@ for target in $targets; do
     dir=build/bench-$target
     cmake --preset "bench-$target" >/dev/null
     cmake --build --preset "bench-$target" >/dev/null
-    runner=$(scripts/i386-runner.sh "$dir/benchmarks/zvutil_run_probe")
+    runner=""
+    [ "$target" = x86_64 ] || runner=$(scripts/i386-runner.sh)
     run=(${runner:+"$runner"}) note=""
     if [ -n "$runner" ]; then
         note="emulated under qemu-i386: the figures show that the programs run, not the speed"

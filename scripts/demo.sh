@@ -31,7 +31,7 @@ cmake --build build/demo/cmake 2>&1 | scripts/progress.sh build/demo/cmake.log |
     { cat build/demo/cmake.log; exit 1; }
 echo "   built build/demo/cmake/demo"
 
-runner=$(scripts/i386-runner.sh build/demo/demo --probe)
+runner=$(scripts/i386-runner.sh)
 run=(${runner:+"$runner"})
 echo "== running the demo (${run[*]:-natively})"
 "${run[@]}" build/demo/demo
