@@ -1,5 +1,6 @@
-// Threads failing library calls while the log sink is swapped, and first
-// callers racing the processor check. Meant for ThreadSanitizer (preset tsan).
+// Threads failing library calls while the log sink is swapped, first callers
+// racing the processor check, spawns from several threads, and a fork beside
+// a thread inside the sink. Meant for ThreadSanitizer (preset tsan).
 #include <atomic>
 #include <sys/wait.h>
 #include <thread>
