@@ -248,6 +248,8 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
              ZVT_CALL(zv_spawn_and_wait(run_true, env, &code)), "alloc"},
             {"zv_spawn,zv_spawn_and_wait", ZV_ERR_NO_MEMORY,  // the child's stack
              ZVT_CALL(zv_spawn_and_wait(run_true, env, &code)), "mmap"},
+            {"zv_spawn,zv_spawn_and_wait", ZV_ERR_NO_MEMORY,  // ... or its usable part
+             ZVT_CALL(zv_spawn_and_wait(run_true, env, &code)), "mprotect"},
             {"zv_wait", ZV_ERR_NULL_ARG, ZVT_CALL(zv_wait(&none, &code))},
             {"zv_wait", ZV_ERR_SYSTEM, ZVT_CALL(zv_wait(&handle, &code))},
             {"zv_wait", ZV_ERR_SYSTEM, ZVT_CALL(zv_spawn_and_wait(run_true, env, &code))},

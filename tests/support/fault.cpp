@@ -121,6 +121,7 @@ WRAP(write, ssize_t, (int a, const void *b, size_t c), "write", -1,
 WRAP(fsync, int, (int a), "fsync", -1, __real_fsync(a))
 WRAP(mmap, void *, (void *a, size_t b, int c, int d, int e, off_t f), "mmap", MAP_FAILED,
      __real_mmap(a, b, c, d, e, f))
+WRAP(mprotect, int, (void *a, size_t b, int c), "mprotect", -1, __real_mprotect(a, b, c))
 // "fstat_grown" reports a file 100 bytes larger than it is, as if it had
 // shrunk since it was measured.
 WRAP(fstat64, int, (int a, struct stat64 *b), "fstat", -1,
