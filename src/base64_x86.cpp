@@ -149,13 +149,7 @@ ZV_TARGET(ZV_AVX512VBMI) inline __m512i encode_block(__m512i bytes)
 
 // Decoding: the value of each character below 0x80, or 0x80 outside the
 // alphabet; a character with its own top bit set is caught by the same test.
-constexpr auto kDecodeValues = [] {
-    std::array<uint8_t, 128> values{};
-    values.fill(0x80);
-    for (uint8_t v = 0; v < 64; v++)
-        values[static_cast<unsigned char>(kAlphabet[v])] = v;
-    return values;
-}();
+constexpr auto kDecodeValues = zv::inverse_table(kAlphabet, 64, 0x80);
 // Byte j of group k's output lies at byte 2 - j of word k after the multiplies.
 constexpr auto kGather = [] {
     std::array<uint8_t, 64> order{};
