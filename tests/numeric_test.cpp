@@ -20,14 +20,7 @@ TEST(Hash64, KnownValuesOnEveryPathAndFeatures)
     std::vector<unsigned char> bytes(4099);
     std::generate(bytes.begin(), bytes.end(), std::mt19937(5));
     // Detection agrees with the compiler's; restrict() hides features until lifted.
-    const uint32_t all = (__builtin_cpu_supports("sse2") ? uint32_t{zv::cpu::kSSE2} : 0) |
-                         (__builtin_cpu_supports("ssse3") ? uint32_t{zv::cpu::kSSSE3} : 0) |
-                         (__builtin_cpu_supports("avx2") ? uint32_t{zv::cpu::kAVX2} : 0) |
-                         (sizeof(void *) == 8 && __builtin_cpu_supports("avx512f") &&
-                                  __builtin_cpu_supports("avx512bw") &&
-                                  __builtin_cpu_supports("avx512vbmi")
-                              ? uint32_t{zv::cpu::kAVX512VBMI}
-                              : 0);
+    const uint32_t all = zvt::detected_features();
     zvt::for_each_feature_path([&](uint32_t paths) {
         EXPECT_EQ(zv::cpu::features(), all & paths);
         for (const auto &[length, expected] : rows)
@@ -42,7 +35,8 @@ TEST(Hash64, KnownValuesOnEveryPathAndFeatures)
     uint64_t hash = 42;
     zvt::expect_failures({ROW(ZV_ERR_BAD_VALUE, hash64, (nullptr, 1, &hash)),
                           ROW(ZV_ERR_BAD_VALUE, hash64, ("a", 0, &hash))});
-    EXPECT_TRUE(hash == 42 && zv::cpu::features() == all);
+    EXPECT_EQ(hash, 42u);
+    EXPECT_EQ(zv::cpu::features(), all);
 }
 
 // A vector path the processor cannot run is tested by no other test either.
@@ -76,9 +70,9 @@ TEST(Prng, KnownSequencesFillsAndFailures)
     EXPECT_EQ(words(zero, 2), words(ones, 2)) << "seed 0 acts as all ones";
     EXPECT_EQ(words(extra, 3), (Words{0xD85F17C16A4BD32D, first[1], first[2]}));
     uint64_t mixed = 0, next = 0; state = seeded(1, 0);
-    EXPECT_TRUE(zv_util_mix_into_prng(&state, 7, &mixed) == ZV_OK &&
-                zv_util_prng_unpacked(&state.position, &state.weyl, state.pool, &next) == ZV_OK &&
-                mixed == 0xB85497AA02510643u && next == first[1]);
+    EXPECT_OK(zv_util_mix_into_prng(&state, 7, &mixed),
+              zv_util_prng_unpacked(&state.position, &state.weyl, state.pool, &next));
+    EXPECT_EQ(std::tie(mixed, next), std::make_tuple(0xB85497AA02510643u, first[1]));
 
     // Fills write the bytes of single steps and leave the same state, on every
     // path: counts around the lane and pool-round thresholds, from positions
@@ -92,7 +86,8 @@ TEST(Prng, KnownSequencesFillsAndFailures)
         std::vector<unsigned char> out(8 * count + 32), expected(out.size());
         std::memcpy(expected.data() + offset, steps.data(), length);
         ASSERT_EQ(zv_util_prng_fill(&filled, out.data() + offset, length), ZV_OK);
-        ASSERT_TRUE(out == expected && words(filled) == words(stepped)) << start << " " << count;
+        ASSERT_EQ(out, expected) << start << " " << count;
+        ASSERT_EQ(words(filled), words(stepped)) << start << " " << count;
     };
     zvt::for_each_feature_path([&](uint32_t) {
         for (uint32_t start : {0u, 1u, 2u, 3u, 11u, 52u, 53u, 63u})
@@ -117,10 +112,20 @@ TEST(Prng, KnownSequencesFillsAndFailures)
         {"", ZV_OK, ZVT_CALL(zv_util_prng_fill(nullptr, nullptr, 0))}});
 }
 
-TEST(Numeric, SumsPowersOfTwoAndOverflow)
+TEST(PowerOfTwo, RoundsUpAndDown)
+{
+    for (auto [value, up, down] : std::initializer_list<std::tuple<uint32_t, uint32_t, uint32_t>>{
+             {0, 0, 0}, {1, 1, 1}, {3, 4, 2}, {0x7FFFFFFF, 0x80000000, 0x40000000},
+             {0x80000000, 0x80000000, 0x80000000}, {0x80000001, 0, 0x80000000}})
+        EXPECT_EQ(std::make_tuple(round_up_power_2(value), round_down_power_2(value)),
+                  std::make_tuple(up, down)) << value;
+}
+
+TEST(Sum, WindowAndFailures)
 {
     zv_util_sum w;  // a window of two slots
-    ASSERT_TRUE(zv_util_sum_init(&w, 2) == ZV_OK && w.current == 0);
+    ASSERT_EQ(zv_util_sum_init(&w, 2), ZV_OK);
+    EXPECT_EQ(w.current, 0u);
     zv_util_sum_inc(&w, 1), zv_util_sum_inc(&w, 2);
     const double first = zv_util_sum_next(&w);
     zv_util_sum_inc(&w, 4), zv_util_sum_set(&w, 5);  // replaces the 4
@@ -130,20 +135,27 @@ TEST(Numeric, SumsPowersOfTwoAndOverflow)
                            zv_util_sum_next(&w), zv_util_sum_get(&w), zv_util_sum_get_total(&w)}),
               (std::vector<double>{3, 5, 8, 8, 5, 0, 5, 0, 8}));
     zv_util_sum_free(&w), zv_util_sum_free(&w), zv_util_sum_free(nullptr);  // all accepted
-    zvt::expect_failures({
-        {"", ZV_OK, [&] { zv_status s = zv_util_sum_init(&w, 3); zv_util_sum_free(&w); return s; }},
-        ROW(ZV_ERR_BAD_VALUE, sum_init, (&w, 0), .log = "N is zero"),
-        ROW(ZV_ERR_NULL_ARG, sum_init, (nullptr, 1)),
-        ROW(ZV_ERR_NO_MEMORY, sum_init, (&w, 4), .point = "alloc", .log = "calloc() failed, N=4")});
+    zvt::expect_failures({ROW(ZV_ERR_BAD_VALUE, sum_init, (&w, 0), .log = "N is zero"),
+                          ROW(ZV_ERR_NULL_ARG, sum_init, (nullptr, 1))});
+    zvt::sweep_allocations(ZVT_CALL(zv_util_sum_init(&w, 4) ?: (zv_util_sum_free(&w), 0u)),
+                           {{"zv_util_sum_init", "calloc() failed, N=4"}});
+}
 
-    for (auto [value, up, down] : std::initializer_list<std::tuple<uint32_t, uint32_t, uint32_t>>{
-             {0, 0, 0}, {1, 1, 1}, {3, 4, 2}, {0x7FFFFFFF, 0x80000000, 0x40000000},
-             {0x80000000, 0x80000000, 0x80000000}, {0x80000001, 0, 0x80000000}})
-        EXPECT_TRUE(round_up_power_2(value) == up && round_down_power_2(value) == down) << value;
-    // Whether the exact product fits, the most negative values included.
-    EXPECT_TRUE(zv_util_check_multiply_overflow_i32(-1, INT32_MIN) &&
-                !zv_util_check_multiply_overflow_i64(INT64_MIN, 1) &&
-                zv_util_check_multiply_overflow_u64(1ull << 32, 1ull << 32));
+// Whether the exact product fits: either side of each bound, the most negative values included.
+TEST(Overflow, MultiplicationPredicates)
+{
+    auto *i32 = zv_util_check_multiply_overflow_i32;
+    auto *i64 = zv_util_check_multiply_overflow_i64;
+    auto u64 = zv_util_check_multiply_overflow_u64;
+    EXPECT_EQ((std::vector{i32(-1, INT32_MIN), i32(-1, INT32_MAX), i32(46341, 46341),
+                           i32(46340, 46341), i32(-46341, 46341), i32(INT32_MIN, 1)}),
+              (std::vector{1, 0, 1, 0, 1, 0}));
+    EXPECT_EQ((std::vector{i64(INT64_MIN, 1), i64(INT64_MIN, -1), i64(3037000500, 3037000500),
+                           i64(3037000499, 3037000500), i64(-3037000500, 3037000500)}),
+              (std::vector{0, 1, 1, 0, 1}));
+    EXPECT_EQ((std::vector{u64(1ull << 32, 1ull << 32), u64(1ull << 32, (1ull << 32) - 1),
+                           u64(UINT64_MAX, 1), u64(UINT64_MAX, 2)}),
+              (std::vector{1, 0, 0, 1}));
 }
 
 }  // namespace

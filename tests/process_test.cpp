@@ -57,7 +57,9 @@ TEST(PidFile, Claims)
     struct stat st;
     mode_t umask_was = umask(0);  // a new file is readable by all, writable by the group
     EXPECT_EQ(zv_util_claim_pid_file(file, "any", &owner), ZV_OK);
-    EXPECT_TRUE(stat(file, &st) == 0 && (st.st_mode & 07777) == 0664 && umask(umask_was) == 0);
+    umask(umask_was);
+    ASSERT_EQ(stat(file, &st), 0);
+    EXPECT_EQ(st.st_mode & 07777, 0664u);
 
     // The holder's long command line does not fit a block cut too short for it.
     pid_t holder = start_sleeper(program), ended = zombie();
@@ -85,7 +87,7 @@ TEST(PidFile, Claims)
         {"", ZV_OK, over(std::to_string(ended))},
         {"", ZV_OK, over("999999999", std::string(100, 'n'))},
         {"", ZV_OK, over("", std::string(150, 'n'))},
-        // Failures; allocation 1 is the content, 2 the /proc path, 3 the command line.
+        // Failures.
         {claim, ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_claim_pid_file(file, nullptr, &owner))},
         {claim, kSys, ZVT_CALL(zv_util_claim_pid_file("/none/app.pid", "n", &owner)), nullptr, 1,
          kUntouched, "Cannot access pid file /none/app.pid (No such file or directory)"},
@@ -93,10 +95,6 @@ TEST(PidFile, Claims)
         {claim, kSys, over(kSelf), "open", 2, kUntouched,
          "Failed to open pid file " + path + " errno 5"},
         {claim, kSys, over(kSelf), "flock", 1, kUntouched, "Failed to lock PID file"},
-        {"zv_util_read_named_file,zv_util_claim_pid_file", kSys, over(kSelf), "fopen", 1},
-        {"zv_util_vasprintf,map_pid_to_exe,map_pid_to_exe,zv_util_claim_pid_file", ZV_ERR_NO_MEMORY,
-         over(kSelf), "alloc", 2},
-        {looked_up, ZV_ERR_NO_MEMORY, over(kSelf), "alloc", 3},
         {claim, ZV_ERR_BAD_VALUE, over(kSelf, std::string(101, 'n'))},
         {"write_pid_file", kSys, over("999999999"), "fopen", 2},
         {"write_pid_file", kSys, ZVT_CALL(zv_util_claim_pid_file(file, "", &owner)), "fwrite", 1},
@@ -109,7 +107,14 @@ TEST(PidFile, Claims)
     for (int i = 0; i < 7; i++)
         zvt::expect_failures(
             {{i < 2 ? looked_up : "", i < 2 ? kSys : zv_status{ZV_OK}, over(texts[i]), "open", 4}});
+    // The content, the /proc path and the command line of the holder, this
+    // process, which is no program of that name.
+    zvt::sweep_allocations(over(kSelf, "zvt-no-such-program"),
+                           {{"zv_util_read_named_file,zv_util_claim_pid_file"},
+                            {"zv_util_vasprintf,map_pid_to_exe,map_pid_to_exe,zv_util_claim_pid_file"},
+                            {looked_up}});
     stop_child(holder), waitpid(ended, nullptr, 0);
+    EXPECT_EQ(zvt::inheritable_opens(), "") << "the library's own opens are close-on-exec";
 }
 
 TEST(PidFile, OfTwoRacingClaimersOneWins)
@@ -119,7 +124,8 @@ TEST(PidFile, OfTwoRacingClaimersOneWins)
     const char *file = path.c_str();
     for (int round = 0; round < 20; round++, unlink(file)) {
         int go[2], done[2];
-        ASSERT_EQ(pipe(go) | pipe(done), 0);
+        ASSERT_EQ(pipe(go), 0);
+        ASSERT_EQ(pipe(done), 0);
         pid_t claimers[2];
         for (pid_t &pid : claimers)
             if ((pid = fork()) == 0) {  // claims when let go, then lives on as the holder
@@ -132,7 +138,7 @@ TEST(PidFile, OfTwoRacingClaimersOneWins)
         close(go[0]), close(go[1]), close(done[1]);
         EXPECT_EQ(zv_util_whole_read(done[0], won, sizeof won), int(sizeof won));
         stop_child(claimers[0]), stop_child(claimers[1]), close(done[0]);
-        EXPECT_TRUE((won[0] == 0) != (won[1] == 0)) << won[0] << " " << won[1];
+        EXPECT_EQ(std::count(won, won + 2, 0), 1) << won[0] << " " << won[1];
         EXPECT_EQ(zvt::get_file(path), std::to_string(won[0] + won[1]));
     }
 }
@@ -161,10 +167,11 @@ TEST(Spawn, ExitCodesArgumentsEnvironmentSignalStateAndNoProcessLeft)
             int32_t code = 12345, joined = 12345;
             errno = EDOM;  // a child's failed exec must not set the caller's
             Argv argv = const_cast<Argv>(args.data());
-            EXPECT_TRUE(zv_spawn(argv, env, &handle) == ZV_OK && zv_wait(&handle, &code) == ZV_OK);
-            EXPECT_TRUE(handle == nullptr && zv_spawn_and_wait(argv, env, &joined) == ZV_OK);
-            EXPECT_EQ(std::tie(code, joined, errno), std::make_tuple(expected, expected, EDOM))
-                << args.end()[-2];
+            int err = 0;
+            EXPECT_OK(zv_spawn(argv, env, &handle), zv_wait(&handle, &code),
+                      zv_spawn_and_wait(argv, env, &joined), (err = errno, ZV_OK));
+            EXPECT_EQ(std::tie(code, joined, err, handle),
+                      std::make_tuple(expected, expected, EDOM, nullptr)) << args.end()[-2];
         }
         EXPECT_EQ(zvt::heap_in_use(), heap);
         EXPECT_EQ(std::fseek(buffered, 0, SEEK_END) == 0 ? std::ftell(buffered) : -1L, 4L);
@@ -172,6 +179,11 @@ TEST(Spawn, ExitCodesArgumentsEnvironmentSignalStateAndNoProcessLeft)
         sigprocmask(SIG_SETMASK, nullptr, &mask);
         EXPECT_EQ(std::make_pair(sigismember(&mask, SIGUSR1), sigismember(&mask, SIGTERM)),
                   std::make_pair(1, 0)) << "the caller's mask as it was";
+        int32_t code = 7;
+        zvt::sweep_allocations(ZVT_CALL(zv_spawn(run_true, env, &handle) ?: zv_wait(&handle, &code)),
+                               {{"zv_spawn"}});
+        zvt::sweep_allocations(ZVT_CALL(zv_spawn_and_wait(run_true, env, &code)),
+                               {{"zv_spawn,zv_spawn_and_wait"}});
     });
     zvt::in_child(true, [&] {  // a process that may start no other
         struct rlimit zero = {0, 0};
@@ -227,15 +239,22 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
         signal(SIGTERM, note_signal);
         for (int sig : {SIGKILL, SIGTERM, SIGSTOP, 0, 32, 40, -1})  // left alone
             EXPECT_EQ(zv_util_ignore_signal(sig), ZV_OK) << sig;
-        for (int sig : {1, 31})
-            EXPECT_TRUE(zv_util_ignore_signal(sig) == ZV_OK && disposition(sig) == SIG_IGN &&
-                        zv_util_reset_signal(sig) == ZV_OK && disposition(sig) == SIG_DFL) << sig;
-        EXPECT_STATUS(ZV_ERR_SYSTEM, zv_util_reset_signal(SIGKILL));  // refused by the kernel
+        for (int sig : {1, 31}) {  // ignored, then reset
+            sighandler_t ignored = SIG_ERR;
+            EXPECT_OK(zv_util_ignore_signal(sig),
+                      (ignored = disposition(sig), zv_util_reset_signal(sig)));
+            EXPECT_EQ(std::make_tuple(ignored, disposition(sig)), std::make_tuple(SIG_IGN, SIG_DFL))
+                << sig;
+        }
+        EXPECT_STATUS(ZV_ERR_SYSTEM, zvt::with_fault("sigaction", 1, EINVAL,
+                                                     ZVT_CALL(zv_util_reset_signal(SIGUSR1))));
         // SIGHUP's failure does not stop the walk.
         EXPECT_EQ(zvt::with_fault("sigaction", 1, EINVAL, zv_util_ignore_common_signals), kSys);
         for (int sig = 1; sig <= 31; sig++) {
             auto expected = sig == SIGTERM ? note_signal : sig == SIGHUP ? SIG_DFL : SIG_IGN;
-            EXPECT_TRUE(sig == SIGKILL || sig == SIGSTOP || disposition(sig) == expected) << sig;
+            if (sig != SIGKILL && sig != SIGSTOP) {
+                EXPECT_EQ(disposition(sig), expected) << sig;
+            }
         }
         // SIGCHLD is ignored now: the kernel reaps children itself and waits fail.
         zv_proc_handle *handle = nullptr, *none = nullptr;
@@ -244,8 +263,6 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
         zvt::expect_failures({
             {"zv_util_reset_signal", ZV_ERR_BAD_VALUE, ZVT_CALL(zv_util_reset_signal(0)), nullptr,
              1, kUntouched, "Invalid or unsupported signal value"},
-            {"zv_spawn,zv_spawn_and_wait", ZV_ERR_NO_MEMORY,
-             ZVT_CALL(zv_spawn_and_wait(run_true, env, &code)), "alloc"},
             {"zv_spawn,zv_spawn_and_wait", ZV_ERR_NO_MEMORY,  // the child's stack
              ZVT_CALL(zv_spawn_and_wait(run_true, env, &code)), "mmap"},
             {"zv_spawn,zv_spawn_and_wait", ZV_ERR_NO_MEMORY,  // ... or its usable part
@@ -257,7 +274,8 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
              ZVT_CALL(zv_util_await_child_timeout(1, 5)), nullptr, 1, kUntouched,
              "Failed to wait for child"},
         });
-        EXPECT_TRUE(handle != nullptr && code == 7 && none == nullptr) << "a failed wait keeps it";
+        EXPECT_NE(handle, nullptr) << "a failed wait keeps it";
+        EXPECT_EQ(std::tie(code, none), std::make_tuple(7, nullptr));
         zv_free_proc_handle(&handle), zv_free_proc_handle(nullptr);
         EXPECT_EQ(handle, nullptr);
     });
@@ -285,22 +303,26 @@ TEST(PidOf, MatchModesOrderFilterAndFailures)
     EXPECT_EQ(zvt::heap_in_use(), heap);
     EXPECT_EQ(lookup(name.substr(4), 0), expected) << "a fragment";
     // A fragment is no exact match; nothing past the compared head matches.
-    EXPECT_TRUE(lookup(name.substr(4), 1).empty() && lookup(longer, 0).empty());
+    EXPECT_EQ(lookup(name.substr(4), 1), std::vector<uint32_t>{});
+    EXPECT_EQ(lookup(longer, 0), std::vector<uint32_t>{});
     uint32_t *pids = reinterpret_cast<uint32_t *>(1), count = 0;
-    EXPECT_TRUE(zv_util_pid_of(name.c_str(), 1, nullptr, &count) == ZV_OK && count == 1);
+    EXPECT_EQ(zv_util_pid_of(name.c_str(), 1, nullptr, &count), ZV_OK);
+    EXPECT_EQ(count, 1u);
     // A zombie's command line is empty: an empty name matches it exactly,
     // and as a fragment every process, the first /proc entry included.
     auto has = [](auto &all, uint32_t pid) { return std::count(all.begin(), all.end(), pid) == 1; };
     std::vector<uint32_t> exact = lookup("", 1), all = lookup("", 0);
-    EXPECT_TRUE(has(exact, ended) && !has(exact, first));
-    EXPECT_TRUE(has(all, ended) && has(all, first) && has(all, 1));
+    EXPECT_EQ(std::make_tuple(has(exact, ended), has(exact, first)), std::make_tuple(true, false));
+    EXPECT_EQ(std::make_tuple(has(all, ended), has(all, first), has(all, 1)),
+              std::make_tuple(true, true, true));
     waitpid(ended, nullptr, 0), stop_child(first), stop_child(second);
 
     zvt::LogCapture log;
     zvt::fault_arm("open", 1, EACCES, ~0u);  // no command line opens: nothing qualifies
     EXPECT_EQ(zv_util_pid_of("", 0, &pids, &count), ZV_OK);
     zvt::fault_clear();
-    EXPECT_TRUE(count == 0 && pids == nullptr);
+    EXPECT_EQ(count, 0u);
+    EXPECT_EQ(pids, nullptr);
     EXPECT_EQ(log.text(), "7/128/0 Nothing suitable in /proc\n");
 
     struct dirent64 entry = {};
@@ -313,11 +335,12 @@ TEST(PidOf, MatchModesOrderFilterAndFailures)
     zvt::expect_failures({
         {"zv_util_pid_of", kSys, ZVT_CALL(zv_util_pid_of("", 0, nullptr, &count)), "scandir", 1,
          kUntouched, "Failed to open /proc"},
-        // The filter drops (0) an entry whose path cannot be formatted.
-        {"zv_util_vasprintf,vet_possible_directory", ZV_ERR_NO_MEMORY,
-         [&] { return vet_possible_directory(&entry) == 0 ? ZV_ERR_NO_MEMORY : ZV_OK; }, "alloc", 1,
-         kUntouched, "Failed to allocate path", 2},
     });
+    // The filter drops (0) an entry whose path cannot be formatted.
+    std::strcpy(entry.d_name, kSelf.c_str());
+    zvt::sweep_allocations(
+        [&] { return vet_possible_directory(&entry) == 0 ? ZV_ERR_NO_MEMORY : ZV_OK; },
+        {{"zv_util_vasprintf,vet_possible_directory", "Failed to allocate path", 2}});
 }
 
 TEST(AwaitChild, EndsOrIsKilledAtTheDeadline)
@@ -333,7 +356,8 @@ TEST(AwaitChild, EndsOrIsKilledAtTheDeadline)
         EXPECT_STATUS(ZV_ERR_TIMEOUT, zv_util_await_child_timeout(sleeper, timeout));
         zvt::fault_clear();
         int status = 0;
-        EXPECT_TRUE(waitpid(sleeper, &status, 0) == sleeper && WTERMSIG(status) == SIGKILL);
+        EXPECT_EQ(waitpid(sleeper, &status, 0), sleeper);
+        EXPECT_EQ(WTERMSIG(status), SIGKILL);
     }
     EXPECT_EQ(zvt::trace_text(), "zv_util_await_child_timeout:ZV_ERR_TIMEOUT "
                                  "zv_util_query_timeout_expired:ZV_ERR_SYSTEM "
@@ -372,9 +396,12 @@ TEST(ProcStat, StatLinesAndThreadIds)
                            "Parsing logic failed, j=120, len=120"}});
     EXPECT_EQ(std::make_tuple(st.pid, st.state, st.ppid, st.pgrp), std::make_tuple(1, 'R', 9, 0));
 
-    EXPECT_TRUE(zv_util_proc_stat(&st, 0) == ZV_OK && st.pid == getpid());  // the caller
-    EXPECT_TRUE(zv_util_proc_stat(&st, getppid()) == ZV_OK && st.pid == getppid());
+    EXPECT_EQ(zv_util_proc_stat(&st, 0), ZV_OK);  // the caller
+    EXPECT_EQ(st.pid, getpid());
+    EXPECT_EQ(zv_util_proc_stat(&st, getppid()), ZV_OK);
+    EXPECT_EQ(st.pid, getppid());
     EXPECT_EQ(zv_util_tid(), getpid());
+    EXPECT_EQ(zvt::inheritable_opens(), "") << "the library's own opens are close-on-exec";
 }
 
 }  // namespace

@@ -50,7 +50,10 @@ TEST(Status, FullTraceKeepsTheNewestFrames)
     ASSERT_LT(kept, 1000u);
     zv_trace_frame frame;
     for (uint32_t i = 0; i < kept; i++)
-        EXPECT_TRUE(zv_trace_get(i, &frame) == 0 && frame.line == int32_t(1000 - kept + i)) << i;
+    {
+        ASSERT_EQ(zv_trace_get(i, &frame), 0);
+        EXPECT_EQ(frame.line, int32_t(1000 - kept + i)) << i;
+    }
     EXPECT_EQ(zv_trace_get(kept, &frame), -1);
     EXPECT_EQ(zv_trace_get(0, nullptr), -1);
 }

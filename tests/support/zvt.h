@@ -26,6 +26,7 @@
 #include <grp.h>
 #include <optional>
 #include <string>
+#include <vector>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -47,6 +48,18 @@ void for_each_feature_path(Check check)
         check(mask);
     }
     zv::cpu::restrict(~0u);
+}
+
+// The features of the vector paths as the compiler detects them.
+inline uint32_t detected_features()
+{
+    return (__builtin_cpu_supports("sse2") ? +zv::cpu::kSSE2 : 0) |
+           (__builtin_cpu_supports("ssse3") ? +zv::cpu::kSSSE3 : 0) |
+           (__builtin_cpu_supports("avx2") ? +zv::cpu::kAVX2 : 0) |
+           (sizeof(void *) == 8 && __builtin_cpu_supports("avx512f") &&
+                    __builtin_cpu_supports("avx512bw") && __builtin_cpu_supports("avx512vbmi")
+                ? +zv::cpu::kAVX512VBMI
+                : 0);
 }
 
 // The point name that arms nothing.
@@ -83,6 +96,9 @@ std::string inheritable_opens();
 // While set, CLOCK_REALTIME, gettimeofday and time all read |now|.
 void pin_clock(std::optional<timespec> now);
 
+// Whether the program runs under valgrind.
+bool under_valgrind();
+
 // Bytes of heap in use (glibc's count, or the sanitizer allocator's).
 size_t heap_in_use();
 // Open descriptors of this process.
@@ -110,7 +126,7 @@ inline std::string trace_text()
 }
 
 // Routes log lines to a fixed in-memory store for its lifetime (no heap use
-// while capturing, so allocation sweeps stay exact).
+// while capturing, so allocation sweeps count only the call's allocations).
 class LogCapture {
 public:
     LogCapture() { zv_log_set_sink(sink, this); }
@@ -141,6 +157,11 @@ private:
 
 #define EXPECT_STATUS(expected, actual) \
     EXPECT_EQ(::zvt::status_name(expected), ::zvt::status_name(actual))
+// Calls made in order (a braced list is evaluated left to right) all return |status|.
+#define EXPECT_ALL(status, ...) \
+    for (std::vector<zv_status> got{__VA_ARGS__}; !got.empty(); got.clear()) \
+    EXPECT_EQ(got, std::vector<zv_status>(got.size(), status))
+#define EXPECT_OK(...) EXPECT_ALL(ZV_OK, __VA_ARGS__)
 
 // The unprivileged user and group that permission cases run as.
 inline constexpr uid_t kNobody = 65534;
@@ -219,7 +240,8 @@ inline void expect_failures(std::initializer_list<FailureRow> rows)
         size_t heap = heap_in_use();
         unsigned fds = open_fd_count();
         LogCapture log;
-        zv_status status = with_fault(point, row.nth, EIO, row.call);
+        int err = std::strcmp(point, "alloc") == 0 ? ENOMEM : EIO;
+        zv_status status = with_fault(point, row.nth, err, row.call);
         EXPECT_EQ(heap_in_use(), heap);
         EXPECT_EQ(open_fd_count(), fds);
         EXPECT_STATUS(row.status, status);
@@ -233,5 +255,36 @@ inline void expect_failures(std::initializer_list<FailureRow> rows)
                                                           " " + row.log + "\n");
     }
 }
+
+// What a call gives when one of its allocations fails: |frames| and the rest
+// as in a failure row.
+struct Step {
+    const char *frames;
+    std::string log = "";
+    unsigned log_after = 0;
+    int32_t err = kUntouched;
+    zv_status status = ZV_ERR_NO_MEMORY;
+};
+
+// Fails allocation 1, then 2, ... of |call| (with ENOMEM), allocation k giving
+// steps[k - 1], checked as a failure row is; with every allocation granted the
+// call then succeeds, records nothing and leaves |row_errno| as |done_err|, so
+// an allocation no step names fails the sweep. |call| releases what it receives.
+inline void sweep_allocations(const std::function<zv_status()> &call, std::vector<Step> steps,
+                              int32_t done_err = kUntouched)
+{
+    unsigned nth = 1;
+    for (const Step &s : steps)
+        expect_failures({{s.frames, s.status, call, "alloc", nth++, s.err, s.log, s.log_after}});
+    expect_failures({{"", ZV_OK, call, "alloc", nth, done_err}});
+}
+
+// A row's call that stores a heap block through &o (of |Type|): a failure
+// must leave o NULL; a block handed out is released.
+#define ZVT_NULLS(Type, ...) [&] { Type o = (Type)8; zv_status s = __VA_ARGS__; \
+    EXPECT_EQ(o == nullptr, s != ZV_OK); std::free(s == ZV_OK ? (void *)o : nullptr); return s; }
+// A sweep's call of a function that returns a heap block, NULL on failure.
+#define ZVT_BLOCK(...) \
+    [&] { void *b = (void *)(__VA_ARGS__); std::free(b); return b ? ZV_OK : ZV_ERR_NO_MEMORY; }
 
 }  // namespace zvt
