@@ -30,7 +30,6 @@ TEST(Descriptors, WholeTransfersAndLineCounts)
     zvt::fault_arm("read_idle", 2, 0, 3);  // four more, then the missing part in two datagrams
     EXPECT_EQ(zv_util_whole_read(ends[0], buf, 6), 6);
     EXPECT_STREQ(buf, "xyzuvw");
-    zvt::fault_clear();
     zvt::fault_arm("read_idle", 1, 0, 4);  // five empty reads end it
     EXPECT_EQ(zv_util_whole_read(ends[0], buf, 1), -EAGAIN);
     zvt::fault_clear();
@@ -189,11 +188,12 @@ TEST(NamedFiles, WriteAppendReadCopy)
         }
     }
     FILE *stream = nullptr;
-    ASSERT_EQ(zv_util_fopen(&stream, nullptr, "a", "%s/%c", dir.path.c_str(), 'g'), ZV_OK);
-    std::fputs("!", stream);
-    std::fclose(stream);
-    EXPECT_EQ(get_file(g), std::string(70000, 'q') + "!");
-    EXPECT_EQ(zvt::inheritable_opens(), "a ") << "only the caller's own stream";
+    zvt::sweep_allocations([&] {  // an existing file by a formatted name, in the caller's mode
+        auto s = zv_util_fopen(&(stream = nullptr), kErr, "r+", "%s/%c", dir.path.c_str(), 'g');
+        EXPECT_EQ(stream == nullptr, s != ZV_OK);
+        return stream && std::fclose(stream), s;
+    }, {{"zv_util_vasprintf,zv_util_fopen"}}, 0);
+    EXPECT_EQ(zvt::inheritable_opens(), "r+ ") << "only the caller's own stream";
 
     EXPECT_ALL(ZV_ERR_NULL_ARG, zv_util_fopen(&stream, 0, nullptr, kAbsent),
         zv_util_read_named_file(kAbsent, nullptr, &n, 0),
@@ -217,11 +217,6 @@ TEST(NamedFiles, WriteAppendReadCopy)
         {"zv_util_get_file_size,zv_util_read_named_file", kSys,
          ZVT_CALL(zv_util_copy_file(kAbsent, f.c_str()))},
     });
-    zvt::sweep_allocations([&] {
-        zv_status s = zv_util_fopen(&(stream = nullptr), kErr, "r", "%s", f.c_str());
-        EXPECT_EQ(stream == nullptr, s != ZV_OK);
-        return stream && std::fclose(stream), s;
-    }, {{"zv_util_vasprintf,zv_util_fopen"}}, 0);
     zvt::sweep_allocations(ZVT_NULLS(char *, zv_util_read_named_file(f.c_str(), &o, &n, nullptr)),
                            {{"zv_util_read_named_file"}});
     zvt::sweep_allocations(write, {{"zv_util_get_directory_component,zv_util_write_named_file"}});
@@ -239,8 +234,8 @@ TEST(Directories, CreateScanQuery)
     EXPECT_OK(zv_util_mkdir((dir / "delta").c_str()),
               zv_util_mkdir_read_only((dir / "gamma").c_str()));
     auto mode = [&](const char *name) { return std::filesystem::status(dir / name).permissions(); };
-    EXPECT_EQ(std::make_tuple(mode("delta"), mode("gamma")),
-              std::make_tuple(std::filesystem::perms(0700), std::filesystem::perms(0500)));
+    EXPECT_EQ(std::make_tuple(unsigned(mode("delta")), unsigned(mode("gamma"))),
+              std::make_tuple(0700u, 0500u));
     zv_util_dirscan_state *scan = zv_util_dirscan_begin(dir.path.c_str());
     EXPECT_EQ(zv_dirscan_file_name(scan), nullptr) << "no current entry before the first advance";
     std::string names;
@@ -256,12 +251,10 @@ TEST(Directories, CreateScanQuery)
     zv_util_dirscan_end(scan), zv_util_dirscan_end(nullptr);  // ended midway: all released
     EXPECT_EQ(zvt::heap_in_use(), heap);
     unsigned fds = zvt::open_fd_count();
-    uint32_t found[3] = {9, 9, 9};
-    // a file
+    uint32_t found[2] = {9, 9};
     EXPECT_OK(zv_util_query_dir_exists((dir / "delta").c_str(), &found[0]),
-              zv_util_query_dir_exists((dir / "beta").c_str(), &found[1]),
-              zv_util_query_dir_exists(kAbsent, &found[2]));
-    EXPECT_EQ(std::make_tuple(found[0], found[1], found[2]), std::make_tuple(1u, 0u, 0u));
+              zv_util_query_dir_exists((dir / "beta").c_str(), &found[1]));  // a file
+    EXPECT_EQ(std::make_tuple(found[0], found[1]), std::make_tuple(1u, 0u));
     EXPECT_EQ(zvt::open_fd_count(), fds);
 
     uint32_t n = 0;
