@@ -12,8 +12,6 @@ constexpr const char *kAbsent = "/nonexistent/zvt";
 int32_t *const kErr = &zvt::row_errno;
 using zvt::kUntouched;
 
-int open_read(const std::string &path) { return open(path.c_str(), O_RDONLY | O_LARGEFILE); }
-
 TEST(Descriptors, WholeTransfersAndLineCounts)
 {
     int ends[2];
@@ -89,7 +87,7 @@ TEST(Descriptors, OpenReadMeasureTruncateDelete)
         zv_util_truncate_file(nullptr, 0, nullptr), zv_util_delete_file(nullptr, nullptr));
     put_file(f, std::string(2000, '\n'));
     ASSERT_EQ(truncate64((put_file(big, ""), big.c_str()), (off64_t{1} << 32) + 1), 0);  // sparse
-    int from = open_read(f), huge = open_read(big), out = 0;
+    int from = open(f.c_str(), O_RDONLY), huge = open(big.c_str(), O_RDONLY | O_LARGEFILE), out = 0;
     lseek(from, 7, SEEK_SET);  // where a failed line count must leave it
     auto read_fd = [&](int of) { return zv_util_read_file(of, &buf, &n, kErr); };
     zvt::expect_failures({
@@ -118,7 +116,7 @@ TEST(Descriptors, OpenReadMeasureTruncateDelete)
         return close(s ? -1 : out), s;
     }, {{"zv_util_vasprintf"}}, 0);
     zvt::sweep_allocations([&] {
-        from = open_read(f);
+        from = open(f.c_str(), O_RDONLY);
         return ZVT_NULLS(char *, zv_util_read_file(from, &o, &n, kErr))() + close(from);
     }, {{"zv_util_read_file", "", 0, ENOMEM}});
 }
@@ -167,7 +165,7 @@ TEST(Sync, StreamsFilesAndPathComponents)
 TEST(NamedFiles, WriteAppendReadCopy)
 {
     zvt::ScratchDir dir;
-    std::string f = dir / "f", g = dir / "g";
+    std::string f = dir / "f", g = dir / "g", big = dir / "big";
     auto write = ZVT_CALL(zv_util_write_named_file(f.c_str(), 1, "data", 4, nullptr));
     EXPECT_OK(zv_util_write_named_file(f.c_str(), 0, "new", 3, nullptr),    // created
               zv_util_write_named_file(f.c_str(), 0, "+more", 5, nullptr),  // appended
@@ -198,7 +196,6 @@ TEST(NamedFiles, WriteAppendReadCopy)
     EXPECT_ALL(ZV_ERR_NULL_ARG, zv_util_fopen(&stream, 0, nullptr, kAbsent),
         zv_util_read_named_file(kAbsent, nullptr, &n, 0),
         zv_util_write_named_file(kAbsent, 1, nullptr, 0, 0), zv_util_copy_file(kAbsent, nullptr));
-    std::string big = dir / "big";
     ASSERT_EQ(truncate64((put_file(big, ""), big.c_str()), (off64_t{1} << 32) + 1), 0);
     // Where offsets are 32 bits every size query refuses 2 GiB or more; with
     // 64-bit offsets the named read refuses 4 GiB.
