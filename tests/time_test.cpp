@@ -32,8 +32,7 @@ TEST(Deadline, OffsetsFromNowAndTheirBounds)
     for (auto [start, val, scale, status, end] : Rows<timespec, int, int, zv_status, timespec>{
              {{10, 600000000}, 1500, 1000, kOk, {12, 100000000}},
              {{10, 600000000}, 400000000, 1000000000, kOk, {11, 0}},
-             {{10, 600000000}, 0, 1, kOk, {10, 600000000}}, {{0, 5}, 3, 3, kOk, {1, 5}},
-             {{kMax - 1, 999999999}, 1, 1, kOk, {kMax, 999999999}},
+             {{0, 5}, 3, 3, kOk, {1, 5}}, {{kMax - 1, 999999999}, 1, 1, kOk, {kMax, 999999999}},
              {{kMax - 5, 0}, INT32_MAX, 1, kOver, {kMax - 5, 0}},
              {{kMax - 1, 900000000}, 1100, 1000, kOver, {kMax, 0}},  // at the carry
              {{4, 5}, -1, 1000, kBad, {4, 5}}, {{4, 5}, 5, 1000000001, kBad, {4, 5}},
@@ -74,7 +73,7 @@ TEST(Deadline, ExpiryOrderAndTimeLeft)
     // the difference at 50 s reads 1.000004e-09.
     const bool exact = !zvt::under_valgrind();
     if (!exact)
-        std::puts("valgrind computes long double in double precision: nanosecond texts not checked");
+        std::puts("valgrind rounds long double to double: nanosecond texts not checked");
     for (auto [deadline, order, left] : Rows<timespec, int, std::string>{
              {{50, 500000000}, 0, "0.000000e+00"}, {{52, 250000000}, 1, "1.750000e+00"},
              {{49, 750000000}, -1, "-7.500000e-01"}, {{50, 500000001}, 1, "1.000000e-09"},
