@@ -19,8 +19,7 @@ TEST(Environment, VariablesAndHostName)
         char *copy = zv_util_getenv("ZV_299");
         EXPECT_EQ(take(zv_util_getenv("ZV_EMPTY")), "");
         EXPECT_EQ(take(zv_util_getenv("ZV_300")), "<NULL>");
-        EXPECT_OK(zv_util_setenv("ZV_299", "short"), zv_util_unsetenv("ZV_EMPTY"),
-                  zv_util_unsetenv("ZV_EMPTY"));  // unsetting twice is no failure
+        EXPECT_OK(zv_util_setenv("ZV_299", "short"), zv_util_unsetenv("ZV_EMPTY"));
         EXPECT_EQ(take(copy), v299) << "the copy outlives the change";
         EXPECT_EQ(take(zv_util_getenv("ZV_299")), "short");
         EXPECT_EQ(take(zv_util_getenv("ZV_EMPTY")), "<NULL>");
@@ -33,9 +32,7 @@ TEST(Environment, VariablesAndHostName)
             {"zv_util_unsetenv", ZV_ERR_SYSTEM, ZVT_CALL(zv_util_unsetenv("A=B")), nullptr, 1,
              kUntouched, "Failed to unset environment variable: Invalid argument"}});
     });
-    char expected[256] = {};
-    ASSERT_EQ(gethostname(expected, sizeof expected), 0);
-    EXPECT_EQ(take(zv_util_get_hostname()), expected);
+    EXPECT_EQ(take(zv_util_get_hostname()) + "\n", zvt::get_file("/proc/sys/kernel/hostname"));
     auto name = ZVT_BLOCK(zv_util_get_hostname());
     zvt::expect_failures({{"", ZV_ERR_NO_MEMORY, name, "sysconf"},
                           {"", ZV_ERR_NO_MEMORY, name, "gethostname"}});
@@ -44,13 +41,10 @@ TEST(Environment, VariablesAndHostName)
 
 TEST(EnsureEgid, SwitchesTheEffectiveGroupOnly)
 {
-    const gid_t own = getegid(), real = getgid();
-    const std::string name = getgrgid(own)->gr_name, nogroup = getgrgid(zvt::kNogroup)->gr_name;
-    ASSERT_EQ(ensure_egid(name.c_str()), ZV_OK);  // nothing changes
+    const gid_t real = getgid();
+    const std::string name = getgrgid(getegid())->gr_name;
     getgrnam("no-such-group");  // the group database keeps what its first lookups allocate
-    auto as = [](std::string group) -> std::function<zv_status()> {
-        return [=] { return ensure_egid(group.c_str()); };
-    };
+    auto as = [](std::string group) { return [=] { return ensure_egid(group.c_str()); }; };
     const char *fn = "ensure_egid";
     const zv_status kSys = ZV_ERR_SYSTEM;
     zvt::expect_failures({
@@ -66,10 +60,9 @@ TEST(EnsureEgid, SwitchesTheEffectiveGroupOnly)
     });
     zvt::sweep_allocations(as(name), {{fn, "Failed to allocate " +
         std::to_string(sysconf(_SC_GETGR_R_SIZE_MAX)) + " byte buffer"}});
-    EXPECT_EQ(getegid(), own);
     if (geteuid() == 0)
         zvt::in_child(false, [&] {
-            EXPECT_EQ(ensure_egid(nogroup.c_str()), ZV_OK);
+            EXPECT_EQ(ensure_egid(getgrgid(zvt::kNogroup)->gr_name), ZV_OK);
             EXPECT_EQ(std::make_tuple(getegid(), getgid()), std::make_tuple(zvt::kNogroup, real))
                 << "only the egid";
         });
