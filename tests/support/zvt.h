@@ -134,25 +134,19 @@ public:
 
     // "level/mask/frames message" per line, where frames counts the trace
     // frames already recorded when the line was written.
-    std::string text() const
-    {
-        std::string all;
-        for (unsigned i = 0; i < count_; i++)
-            all += slots_[i];
-        return all;
-    }
+    std::string text() const { return text_; }
 
 private:
     static void sink(void *context, int32_t level, uint32_t mask, const char *, const char *,
                      int32_t, const char *message)
     {
         auto *self = static_cast<LogCapture *>(context);
-        if (self->count_ < std::size(self->slots_))
-            std::snprintf(self->slots_[self->count_++], sizeof self->slots_[0], "%d/%u/%u %s\n",
-                          level, mask, zv_trace_count(), message ? message : "");
+        size_t room = sizeof self->text_ - self->used_;
+        self->used_ += std::min<size_t>(room - 1, std::snprintf(self->text_ + self->used_, room,
+            "%d/%u/%u %s\n", level, mask, zv_trace_count(), message ? message : ""));
     }
-    char slots_[32][1100];
-    unsigned count_ = 0;
+    char text_[32 * 1100] = "";
+    size_t used_ = 0;
 };
 
 #define EXPECT_STATUS(expected, actual) \
