@@ -14,10 +14,9 @@ TEST(Status, FramesAndLinesInOrderWithErrnoKept)
 {
     zvt::LogCapture log;
     errno = EDOM;
-    EXPECT_EQ(probe_fail(), ZV_ERR_BAD_VALUE);
-    EXPECT_EQ(probe_log_fail(), ZV_ERR_SYSTEM);
-    EXPECT_EQ(probe_pass_on(), ZV_ERR_TIMEOUT);
-    EXPECT_EQ(probe_perror_fail(), ZV_ERR_SYSTEM);
+    EXPECT_EQ((std::vector{probe_fail(), probe_log_fail(), probe_pass_on(), probe_perror_fail()}),
+              (std::vector<zv_status>{ZV_ERR_BAD_VALUE, ZV_ERR_SYSTEM, ZV_ERR_TIMEOUT,
+                                      ZV_ERR_SYSTEM}));
     EXPECT_EQ(errno, EDOM);
     EXPECT_EQ(zvt::trace_text(), "probe_fail:ZV_ERR_BAD_VALUE probe_log_fail:ZV_ERR_SYSTEM "
                                  "probe_pass_on:ZV_ERR_TIMEOUT probe_perror_fail:ZV_ERR_SYSTEM");
@@ -49,8 +48,7 @@ TEST(Status, FullTraceKeepsTheNewestFrames)
     const uint32_t kept = zv_trace_count();
     ASSERT_LT(kept, 1000u);
     zv_trace_frame frame;
-    for (uint32_t i = 0; i < kept; i++)
-    {
+    for (uint32_t i = 0; i < kept; i++) {
         ASSERT_EQ(zv_trace_get(i, &frame), 0);
         EXPECT_EQ(frame.line, int32_t(1000 - kept + i)) << i;
     }
