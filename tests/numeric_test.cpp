@@ -35,8 +35,7 @@ TEST(Hash64, KnownValuesOnEveryPathAndFeatures)
     uint64_t hash = 42;
     zvt::expect_failures({ROW(ZV_ERR_BAD_VALUE, hash64, (nullptr, 1, &hash)),
                           ROW(ZV_ERR_BAD_VALUE, hash64, ("a", 0, &hash))});
-    EXPECT_EQ(hash, 42u);
-    EXPECT_EQ(zv::cpu::features(), all);
+    EXPECT_EQ(std::make_tuple(hash, zv::cpu::features()), std::make_tuple(uint64_t{42}, all));
 }
 
 // A vector path the processor cannot run is tested by no other test either.

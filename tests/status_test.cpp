@@ -10,9 +10,10 @@ zv_status probe_log_fail() { return ZV_LOG_FAIL(ZV_ERR_SYSTEM, "Failed to %s\n",
 zv_status probe_pass_on() { return ZV_FAIL_THEN_LOG(ZV_ERR_TIMEOUT, "Passed on\n"); }
 zv_status probe_perror_fail() { return ZV_PERROR_FAIL(ENOENT, ZV_ERR_SYSTEM, "Failed to open\n"); }
 
-TEST(Status, FramesAndLinesInOrderWithErrnoKept)
+TEST(Status, FramesAndLinesInOrderWithErrnoKeptAndShown)
 {
     zvt::LogCapture log;
+    const std::string pad(600, 'x');
     errno = EDOM;
     EXPECT_EQ((std::vector{probe_fail(), probe_log_fail(), probe_pass_on(), probe_perror_fail()}),
               (std::vector<zv_status>{ZV_ERR_BAD_VALUE, ZV_ERR_SYSTEM, ZV_ERR_TIMEOUT,
@@ -24,20 +25,15 @@ TEST(Status, FramesAndLinesInOrderWithErrnoKept)
     ASSERT_EQ(zv_trace_get(0, &first), 0);
     EXPECT_EQ(first.file + (":" + std::to_string(first.line)),
               "tests/status_test.cpp:" + std::to_string(kProbeLine));
-    // A failure found here is logged before its frame, a passed-on one after.
-    EXPECT_EQ(log.text(), "3/128/1 Failed to probe\n3/128/3 Passed on\n"
-                          "3/128/3 Failed to open: No such file or directory\n");
-}
-
-TEST(Status, PercentMIsTheCallersErrnoInShortAndLongLines)
-{
-    zvt::LogCapture log;
-    const std::string pad(600, 'x');
+    // %m is the caller's errno, in short and long lines.
     errno = EACCES;
     zv_util_log_internal(3, 128, "f", "x.cpp", 1, "%s (%m)\n", "short");
     zv_util_log_internal(3, 128, "f", "x.cpp", 1, "%s (%m)\n", pad.c_str());
     EXPECT_EQ(errno, EACCES);
-    EXPECT_EQ(log.text(), "3/128/0 short (Permission denied)\n3/128/0 " + pad +
+    // A failure found here is logged before its frame, a passed-on one after.
+    EXPECT_EQ(log.text(), "3/128/1 Failed to probe\n3/128/3 Passed on\n"
+                          "3/128/3 Failed to open: No such file or directory\n"
+                          "3/128/4 short (Permission denied)\n3/128/4 " + pad +
                               " (Permission denied)\n");
 }
 

@@ -82,9 +82,8 @@ TEST(Base64, KnownAnswersSkippedCharactersAndEveryPathAsScalar)
         SCOPED_TRACE(features);
         for (const auto &[bytes, text] : rows)  // padded and unpadded text decode alike
             EXPECT_EQ(std::make_tuple(encode(bytes), decode(text),
-                                      decode(text.substr(0, text.find('='))),
-                                      size_t{zv_util_to_base64_size(bytes.size())}),
-                      std::make_tuple(text, bytes, bytes, text.size()));
+                                      decode(text.substr(0, text.find('=')))),
+                      std::make_tuple(text, bytes, bytes));
         // A lone final value carries no byte.
         EXPECT_EQ(decode(salted + junk + kAlphabet + "Y", 64), kAlphabetBytes + kAlphabetBytes);
         for (char c : junk)  // a 64-character block and then its halves hold it
