@@ -10,7 +10,7 @@ zv_status probe_log_fail() { return ZV_LOG_FAIL(ZV_ERR_SYSTEM, "Failed to %s\n",
 zv_status probe_pass_on() { return ZV_FAIL_THEN_LOG(ZV_ERR_TIMEOUT, "Passed on\n"); }
 zv_status probe_perror_fail() { return ZV_PERROR_FAIL(ENOENT, ZV_ERR_SYSTEM, "Failed to open\n"); }
 
-TEST(Status, FramesAndLinesInOrderWithErrnoKeptAndShown)
+TEST(Status, FramesAndLinesInOrderWithErrnoKept)
 {
     zvt::LogCapture log;
     const std::string pad(600, 'x');
@@ -21,9 +21,9 @@ TEST(Status, FramesAndLinesInOrderWithErrnoKeptAndShown)
     EXPECT_EQ(errno, EDOM);
     EXPECT_EQ(zvt::trace_text(), "probe_fail:ZV_ERR_BAD_VALUE probe_log_fail:ZV_ERR_SYSTEM "
                                  "probe_pass_on:ZV_ERR_TIMEOUT probe_perror_fail:ZV_ERR_SYSTEM");
-    zv_trace_frame first;
-    ASSERT_EQ(zv_trace_get(0, &first), 0);
-    EXPECT_EQ(first.file + (":" + std::to_string(first.line)),
+    zv_trace_frame frame;
+    ASSERT_EQ(zv_trace_get(0, &frame), 0);
+    EXPECT_EQ(frame.file + (":" + std::to_string(frame.line)),
               "tests/status_test.cpp:" + std::to_string(kProbeLine));
     // %m is the caller's errno, in short and long lines.
     errno = EACCES;
@@ -35,15 +35,12 @@ TEST(Status, FramesAndLinesInOrderWithErrnoKeptAndShown)
                           "3/128/3 Failed to open: No such file or directory\n"
                           "3/128/4 short (Permission denied)\n3/128/4 " + pad +
                               " (Permission denied)\n");
-}
 
-TEST(Status, FullTraceKeepsTheNewestFrames)
-{
+    // A full trace keeps the newest frames.
     for (int32_t line = 0; line < 1000; line++)
         zv_trace_save("f", "x.cpp", line, ZV_ERR_BAD_VALUE);
     const uint32_t kept = zv_trace_count();
     ASSERT_LT(kept, 1000u);
-    zv_trace_frame frame;
     for (uint32_t i = 0; i < kept; i++) {
         ASSERT_EQ(zv_trace_get(i, &frame), 0);
         EXPECT_EQ(frame.line, int32_t(1000 - kept + i)) << i;

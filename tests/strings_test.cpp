@@ -17,6 +17,9 @@ using zvt::kUntouched, zvt::Text;
 // |block| holds |bytes|. At sizes where the allocator leaves no slack this
 // shows a block one byte short without the sanitizer too.
 #define EXPECT_HOLDS(block, bytes) EXPECT_GE(malloc_usable_size(block), size_t{bytes})
+// A row's call that must leave what it would store through &o (of |Type|) as it was.
+#define UNTOUCHED(Type, ...) \
+    [&] { Type o = (Type)8; zv_status s = __VA_ARGS__; EXPECT_EQ(o, (Type)8); return s; }
 
 constexpr char kAlphabet[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
 
@@ -104,13 +107,12 @@ TEST(Base64, KnownAnswersSkippedCharactersAndEveryPathAsScalar)
 
     // The coder records no frame and logs nothing. Text beyond 32 bits is
     // refused; the longest that fits is allocated.
-    char *out = reinterpret_cast<char *>(8);
     uint32_t n = 7;
     zvt::expect_failures({
-        {"", kMem, ZVT_CALL(zv_util_base64_encode("", 3221225470u, &out, &n))},
+        {"", kMem, UNTOUCHED(char *, zv_util_base64_encode("", 3221225470u, &o, &n))},
         {"", kMem, ZVT_NULLS(char *, zv_util_base64_encode("", 3221225469u, &o, &n)), "alloc_huge"},
     });
-    EXPECT_EQ(std::tie(out, n), std::make_tuple(reinterpret_cast<char *>(8), 7u));
+    EXPECT_EQ(n, 7u);
     zvt::sweep_allocations(ZVT_NULLS(char *, zv_util_base64_encode("foo", 3, &o, &n)), {{""}});
     zvt::sweep_allocations(ZVT_NULLS(uint8_t *, zv_util_base64_decode("Zg", 2, &o, &n)), {{""}});
 }
@@ -166,8 +168,6 @@ TEST(Strings, SplitJoinAppendAndFailures)
     // no field gives no array.
     EXPECT_EQ(split(",a,,b,", ",") + split("one--two", "--") + split("a-b", "--") +
               split("xaaa", "aa") + split(",,,", ",") + split("", ","), "|a|b||one|two||a-b||x|a|");
-    for (std::string field = "x"; field.size() < 30; field += 'x')  // through every block size
-        EXPECT_EQ(split((field + ",").c_str(), ","), "|" + field + "|");
     auto join = [](std::vector<const char *> strings, const char *separator, uint32_t count) {
         char *out = nullptr;
         uint32_t size = 0;
@@ -233,9 +233,8 @@ TEST(Strings, SplitJoinAppendAndFailures)
     // too slow under emulation.
     std::vector<const char *> pieces(65536, sep.c_str() + 1);
     if (sizeof(void *) == 8)
-        zvt::expect_failures(
-            {ROW(kOver, join, (pieces.data(), 65535, "", &out, &size)),
-             ROW(kOver, join, (pieces.data(), 65536, "", &out, &size))});
+        zvt::expect_failures({ROW(kOver, join, (pieces.data(), 65535, "", &out, &size)),
+                              ROW(kOver, join, (pieces.data(), 65536, "", &out, &size))});
     EXPECT_EQ(std::tie(out, fields, n, lengths[2], refused),
               std::make_tuple((char *)8, (char **)8, 7u, UINT32_MAX - 3, 0u));
 
@@ -321,16 +320,14 @@ TEST(Format, AllocatesExactlyTheMeasuredSize)
     EXPECT_HOLDS(text, size);
     std::free(text);
 
-    char *out = reinterpret_cast<char *>(8);
     const char *no_format = nullptr, *vas = "zv_util_vasprintf";
     auto format = ZVT_NULLS(char *, zv_util_asprintf(&o, &zvt::row_errno, "%s/%d", "path", 12));
     zvt::expect_failures({
-        {vas, kNull, ZVT_CALL(zv_util_asprintf(&out, &zvt::row_errno, no_format, 0))},
+        {vas, kNull, UNTOUCHED(char *, zv_util_asprintf(&o, &zvt::row_errno, no_format, 0))},
         {"zv_util_printf_vsize", kNull, ZVT_CALL(vsize(nullptr, "x"))},
         {"zv_util_printf_vsize,zv_util_vasprintf", ZV_ERR_SYSTEM, format, "vsnprintf"},
         {vas, ZV_ERR_SYSTEM, format, "vsnprintf", 2, EIO},
     });
-    EXPECT_EQ(out, reinterpret_cast<char *>(8));
     zvt::sweep_allocations(format, {{vas}}, 0);
 }
 
@@ -353,19 +350,17 @@ TEST(Wide, ConvertsInTheLocaleIntoAnExactBlock)
     }
     std::setlocale(LC_CTYPE, saved.c_str());
 
-    wchar_t *wide_out = reinterpret_cast<wchar_t *>(8);
     uint32_t count = 7;
     const char *wchar = "zv_util_char_to_wchar";
     auto convert = ZVT_NULLS(wchar_t *, zv_util_char_to_wchar("abc", 0, &o, &count));
     zvt::expect_failures({
         {wchar, kNull, ZVT_CALL(zv_util_char_to_wchar("a", 0, nullptr, &count))},
         // Refused before allocating.
-        {wchar, kBad, ZVT_CALL(zv_util_char_to_wchar("a\x80", 0, &wide_out, &count))},
+        {wchar, kBad, UNTOUCHED(wchar_t *, zv_util_char_to_wchar("a\x80", 0, &o, &count))},
         // Converting fails, or stops short of the end.
         {wchar, kBad, convert, "mbsrtowcs", 2},
         {wchar, ZV_ERR_TOO_SMALL, convert, "mbsrtowcs_short"},
     });
-    EXPECT_EQ(wide_out, reinterpret_cast<wchar_t *>(8));
     zvt::sweep_allocations(convert, {{wchar}});
 }
 
