@@ -55,6 +55,7 @@ TEST(Getopt, FormsHandlersAndFailures)
     zvt::expect_failures({
         {str.c_str(), bad, ZVT_CALL(parse({"prog", "-o", k301.c_str()}).first)},
         {str.c_str(), bad, ZVT_CALL(parse({"prog", "-o", "a", "/o", "b"}).first)},  // given twice
+        {num.c_str(), bad, ZVT_CALL(parse({"prog", "-n", k301.c_str()}).first)},
         {num.c_str(), bad, ZVT_CALL(parse({"prog", "-n", "-2147483649"}).first)},
         {("zv_util_getopt_flag" + tail).c_str(), bad, ZVT_CALL(parse({"prog", "-f", "x"}).first)},
         {tail.c_str() + 1, ZV_ERR_SYSTEM, ZVT_CALL(parse({"prog", "-o", "a", "--count"}).first),

@@ -10,8 +10,7 @@
 
 namespace {
 
-constexpr auto kNull = ZV_ERR_NULL_ARG, kMem = ZV_ERR_NO_MEMORY, kBad = ZV_ERR_BAD_VALUE,
-               kOver = ZV_ERR_OVERFLOW;
+constexpr auto kNull = ZV_ERR_NULL_ARG, kMem = ZV_ERR_NO_MEMORY, kBad = ZV_ERR_BAD_VALUE;
 using zvt::kUntouched, zvt::Text;
 
 // |block| holds |bytes|. At sizes where the allocator leaves no slack this
@@ -203,7 +202,10 @@ TEST(Strings, SplitJoinAppendAndFailures)
     uint32_t n = 7, lengths[] = {0, UINT32_MAX - 2, UINT32_MAX - 3}, size, count = 7, refused = 7;
     const char *strings[] = {"a", "b"}, *log = "Allocation failed";
     std::string sep(65538, '-');
-    std::vector<const char *> empties(65535, "");  // 65535 separators of 65537 make 2^32 - 1
+    // 65535 separators of 65537 characters make 2^32 - 1; so do as many strings of 65537
+    // characters and no separator, which leaves no room for the NUL; one string more makes
+    // too many characters.
+    std::vector<const char *> empties(65535, ""), pieces(65536, sep.c_str() + 1);
     // A NULL between checked pointers fails either || turned into &&.
     auto logged = [line = std::string(128, '\0')](auto... p) mutable {
         line.resize(std::snprintf(line.data(), 128, "NULL argument detected: %p %p %p %p",
@@ -216,7 +218,7 @@ TEST(Strings, SplitJoinAppendAndFailures)
         ROW(kNull, split, (log, log, &fields, nullptr), .log = logged(log, log, &fields, nullptr)),
         ROW(kBad, split, ("a", "", &fields, &n)),
         ROW(kNull, join, (strings, 1, nullptr, &out, &size)),
-        ROW(kOver, join, (empties.data(), 65535, sep.c_str(), &out, &refused)),
+        ROW(ZV_ERR_OVERFLOW, join, (empties.data(), 65535, sep.c_str(), &out, &refused)),
         // The size just fits; allocating it fails.
         {"zv_util_join", kMem,
          ZVT_NULLS(char *, zv_util_join(empties.data(), 65535, sep.c_str() + 1, &o, &size)),
@@ -225,16 +227,13 @@ TEST(Strings, SplitJoinAppendAndFailures)
         ROW(kBad, append_string, (&out, &n, "xy", 0)),
         ROW(kBad, append_string, (&out, &lengths[0], "xy", 1)),
         // The new length and its NUL: one past 32 bits, then just fitting.
-        ROW(kOver, append_string, (&out, &lengths[1], "xy", 2)),
+        ROW(ZV_ERR_OVERFLOW, append_string, (&out, &lengths[1], "xy", 2)),
         ROW(kMem, append_string, (&out, &lengths[2], "xy", 2), .point = "alloc_huge"),
     });
-    // 65535 strings of 65537 characters and no separator: 2^32 - 1 characters and
-    // no room for the NUL; one string more, too many characters. Reading 4 GiB is
-    // too slow under emulation.
-    std::vector<const char *> pieces(65536, sep.c_str() + 1);
+    // Reading 4 GiB is too slow under emulation.
     if (sizeof(void *) == 8)
-        zvt::expect_failures({ROW(kOver, join, (pieces.data(), 65535, "", &out, &size)),
-                              ROW(kOver, join, (pieces.data(), 65536, "", &out, &size))});
+        zvt::expect_failures({ROW(ZV_ERR_OVERFLOW, join, (pieces.data(), 65535, "", &out, &size)),
+                              ROW(ZV_ERR_OVERFLOW, join, (pieces.data(), 65536, "", &out, &size))});
     EXPECT_EQ(std::tie(out, fields, n, lengths[2], refused),
               std::make_tuple((char *)8, (char **)8, 7u, UINT32_MAX - 3, 0u));
 
