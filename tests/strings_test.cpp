@@ -245,8 +245,7 @@ TEST(Strings, SplitJoinAppendAndFailures)
     zvt::sweep_allocations(ZVT_NULLS(char *, zv_util_join(strings, 2, ",", &o, &size)),
                            {{"zv_util_join"}});
     // The string stays NULL until the call succeeds.
-    zvt::sweep_allocations(
-        ZVT_NULLS(char *, zv_util_append_string(&(o = nullptr), &(n = 0), "xy", 2)),
+    zvt::sweep_allocations(ZVT_NULLS(char *, zv_util_append_string(&(o = nullptr), &n, "xy", 2)),
                            {{"zv_util_append_string"}});
 }
 
