@@ -234,8 +234,8 @@ TEST(Strings, SplitJoinAppendAndFailures)
     if (sizeof(void *) == 8)
         zvt::expect_failures({ROW(ZV_ERR_OVERFLOW, join, (pieces.data(), 65535, "", &out, &size)),
                               ROW(ZV_ERR_OVERFLOW, join, (pieces.data(), 65536, "", &out, &size))});
-    EXPECT_EQ(std::tie(out, fields, n, lengths[2], refused),
-              std::make_tuple((char *)8, (char **)8, 7u, UINT32_MAX - 3, 0u));
+    EXPECT_EQ(std::make_tuple((void *)out, (void *)fields, n, lengths[2], refused),
+              std::make_tuple((void *)8, (void *)8, 7u, UINT32_MAX - 3, 0u));
 
     // The array comes first, then one block per field.
     const zvt::Step field{"zv_util_split", "Failed to allocate memory"};
