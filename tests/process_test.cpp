@@ -244,8 +244,7 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
         ASSERT_EQ(zv_spawn(run_true, env, &handle), ZV_OK);
         auto spawn_wait = ZVT_CALL(zv_spawn_and_wait(run_true, env, &code));
         zvt::expect_failures({
-            {"zv_util_reset_signal", ZV_ERR_BAD_VALUE, ZVT_CALL(zv_util_reset_signal(0)), nullptr,
-             1, kUntouched, "Invalid or unsupported signal value"},
+            ROW(ZV_ERR_BAD_VALUE, reset_signal, (0), .log = "Invalid or unsupported signal value"),
             {"", kSys, ZVT_CALL(zv_util_reset_signal(SIGUSR1)), "sigaction"},  // with no frame
             // The child's stack, or its usable part.
             {"zv_spawn,zv_spawn_and_wait", ZV_ERR_NO_MEMORY, spawn_wait, "mmap"},
@@ -253,9 +252,7 @@ TEST(Signals, DispositionsThenWaitsWithSigchldIgnored)
             {"zv_wait", ZV_ERR_NULL_ARG, ZVT_CALL(zv_wait(&none, &code))},
             {"zv_wait", ZV_ERR_SYSTEM, ZVT_CALL(zv_wait(&handle, &code))},
             {"zv_wait", ZV_ERR_SYSTEM, spawn_wait},
-            {"zv_util_await_child_timeout", ZV_ERR_SYSTEM,
-             ZVT_CALL(zv_util_await_child_timeout(1, 5)), nullptr, 1, kUntouched,
-             "Failed to wait for child"},
+            ROW(kSys, await_child_timeout, (1, 5), .log = "Failed to wait for child"),
         });
         EXPECT_EQ(std::make_tuple(handle != nullptr, code, none), std::make_tuple(true, 7, nullptr))
             << "a failed wait keeps the handle";
@@ -353,19 +350,16 @@ TEST(ProcStat, StatLinesAndThreadIds)
               std::make_tuple(uint32_t(-5), 123456789u, -1, 4294967295u, 4294967295u, 5000000000u));
     EXPECT_EQ(st.delayacct_blkio_ticks, 9000000000u);
     zvt::expect_failures({
-        {"zv_util_proc_stat", ZV_ERR_NULL_ARG, ZVT_CALL(zv_util_proc_stat(nullptr, 0)), nullptr, 1,
-         kUntouched, "ret_proc_stat is NULL"},
-        {"zv_util_proc_stat", ZV_ERR_OPEN_FAILED, ZVT_CALL(zv_util_proc_stat(&st, -1))},
-        {"zv_util_proc_stat", ZV_ERR_IO, ZVT_CALL(zv_util_proc_stat(&st, "/dev/null")), nullptr, 1,
-         kUntouched, "getline() failed: Success"},
+        ROW(ZV_ERR_NULL_ARG, proc_stat, (nullptr, 0), .log = "ret_proc_stat is NULL"),
+        ROW(ZV_ERR_OPEN_FAILED, proc_stat, (&st, -1)),
+        ROW(ZV_ERR_IO, proc_stat, (&st, "/dev/null"), .log = "getline() failed: Success"),
     });
     EXPECT_EQ(std::memcmp(&st, std::array<char, sizeof st>{}.data(), sizeof st), 0);
     // The record is cleared first; the fields before the missing one are filled. The line
     // fills getline's first 120-byte buffer: nothing past its end may be looked at.
     zvt::put_file(path, "1 (" + std::string(110, 'x') + ") R 9\n");
-    zvt::expect_failures({{"zv_util_proc_stat", ZV_ERR_SYSTEM,
-                           ZVT_CALL(zv_util_proc_stat(&st, path.c_str())), nullptr, 1, kUntouched,
-                           "Parsing logic failed, j=120, len=120"}});
+    zvt::expect_failures({ROW(kSys, proc_stat, (&st, path.c_str()),
+                              .log = "Parsing logic failed, j=120, len=120")});
     EXPECT_EQ(std::make_tuple(st.pid, st.state, st.ppid, st.pgrp), std::make_tuple(1, 'R', 9, 0));
 
     EXPECT_EQ(zv_util_proc_stat(&st, 0), ZV_OK);  // the caller

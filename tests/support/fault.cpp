@@ -77,7 +77,7 @@ bool under_valgrind() { return RUNNING_ON_VALGRIND != 0; }
 
 #if !defined(__SANITIZE_ADDRESS__)
 constexpr const char *kNoCache = "glibc.malloc.tcache_count=0";
-bool cache_off() { return under_valgrind() || std::strstr(getenv("GLIBC_TUNABLES") ?: "", kNoCache); }
+bool cache_off() { return under_valgrind() || strstr(getenv("GLIBC_TUNABLES") ?: "", kNoCache); }
 
 // glibc counts a block parked in its per-thread cache as in use, so the leak
 // checks need that cache off; it reads the setting at start-up only, so the
