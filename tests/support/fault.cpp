@@ -215,9 +215,7 @@ int __wrap_open(const char *path, int flags, ...)
     va_start(args, flags);
     mode_t mode = __OPEN_NEEDS_MODE(flags) ? va_arg(args, unsigned) : 0;
     va_end(args);
-    char text[16];
-    std::snprintf(text, sizeof text, "%d", flags);
-    zvt::note_open(flags & O_CLOEXEC, text);
+    zvt::note_open(flags & O_CLOEXEC, std::to_string(flags).c_str());
     return HIT("open") ? -1 : __real_open(path, flags, mode);
 }
 
