@@ -230,8 +230,15 @@ size_t decode_avx2(const unsigned char *in, size_t n, uint8_t *out, size_t room)
 ZV_TARGET(ZV_AVX512VBMI) size_t encode_avx512vbmi(const uint8_t *in, size_t n, char *out)
 {
     size_t i = 0;
-    for (; n - i >= 48; i += 48, out += 64)
+    // Whole-vector loads while 64 bytes remain: from memory, a run of masked
+    // loads goes at about 2/3 of their speed here (AMD Zen 5), as if the
+    // prefetcher ignored them.
+    for (; n - i >= 64; i += 48, out += 64)
+        _mm512_storeu_si512(out, encode_block(_mm512_loadu_si512(in + i)));
+    if (n - i >= 48) {
         _mm512_storeu_si512(out, encode_block(_mm512_maskz_loadu_epi8(kLow48, in + i)));
+        i += 48, out += 64;
+    }
     // The last whole groups, fewer than 16, under masks.
     const size_t groups = (n - i) / 3;
     if (groups != 0) {
