@@ -22,8 +22,10 @@ ZV_INTERNAL size_t encode_avx512vbmi(const uint8_t *in, size_t n, char *out);
 // alphabet characters into 12, 24 or 48 bytes, stopping at the first block
 // that holds any other character or when fewer characters remain. Each store
 // writes a whole vector, so |room|, the bytes that may be written at |out|,
-// bounds the blocks too. Returns the characters consumed (a multiple of 16);
-// the bytes written are 3/4 of it.
+// bounds the blocks too. The AVX-512 VBMI kernel then takes, under masks, the
+// whole quads of alphabet characters that follow and fit |room|. Returns the
+// characters consumed (a multiple of 16, of 4 for AVX-512 VBMI); the bytes
+// written are 3/4 of it.
 ZV_INTERNAL size_t decode_ssse3(const unsigned char *in, size_t n, uint8_t *out, size_t room);
 ZV_INTERNAL size_t decode_avx2(const unsigned char *in, size_t n, uint8_t *out, size_t room);
 ZV_INTERNAL size_t decode_avx512vbmi(const unsigned char *in, size_t n, uint8_t *out, size_t room);

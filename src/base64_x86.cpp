@@ -159,19 +159,22 @@ constexpr auto kGather = [] {
     return order;
 }();
 
-// The block's 48 bytes in the low bytes, or false when a character lies
-// outside the alphabet.
-ZV_TARGET(ZV_AVX512VBMI) inline bool decode_block(const unsigned char *in, __m512i *out)
+// The values of the 64 characters of |text|, and in |outside| a bit for each
+// character outside the alphabet.
+ZV_TARGET(ZV_AVX512VBMI) inline __m512i decode_values(__m512i text, __mmask64 *outside)
 {
-    const __m512i text = _mm512_loadu_si512(in);
     const __m512i values = _mm512_permutex2var_epi8(_mm512_loadu_si512(kDecodeValues.data()), text,
                                                     _mm512_loadu_si512(kDecodeValues.data() + 64));
-    if (_mm512_movepi8_mask(_mm512_or_si512(values, text)) != 0)
-        return false;
+    *outside = _mm512_movepi8_mask(_mm512_or_si512(values, text));
+    return values;
+}
+
+// The 16 groups' 48 bytes in the low bytes.
+ZV_TARGET(ZV_AVX512VBMI) inline __m512i decode_groups(__m512i values)
+{
     __m512i groups = _mm512_madd_epi16(_mm512_maddubs_epi16(values, _mm512_set1_epi32(kPairValues)),
                                        _mm512_set1_epi32(kPairPairs));
-    *out = _mm512_maskz_permutexvar_epi8(kAll, _mm512_loadu_si512(kGather.data()), groups);
-    return true;
+    return _mm512_maskz_permutexvar_epi8(kAll, _mm512_loadu_si512(kGather.data()), groups);
 }
 #endif
 
@@ -230,6 +233,13 @@ size_t decode_avx2(const unsigned char *in, size_t n, uint8_t *out, size_t room)
 ZV_TARGET(ZV_AVX512VBMI) size_t encode_avx512vbmi(const uint8_t *in, size_t n, char *out)
 {
     size_t i = 0;
+    // Two blocks a turn, loaded as whole vectors: from memory, a run of masked
+    // loads goes at about 2/3 of their speed here (AMD Zen 5), as if the
+    // prefetcher ignored them.
+    for (; n - i >= 112; i += 96, out += 128) {
+        _mm512_storeu_si512(out, encode_block(_mm512_loadu_si512(in + i)));
+        _mm512_storeu_si512(out + 64, encode_block(_mm512_loadu_si512(in + i + 48)));
+    }
     for (; n - i >= 48; i += 48, out += 64)
         _mm512_storeu_si512(out, encode_block(_mm512_maskz_loadu_epi8(kLow48, in + i)));
     // The last whole groups, fewer than 16, under masks.
@@ -245,13 +255,32 @@ ZV_TARGET(ZV_AVX512VBMI)
 size_t decode_avx512vbmi(const unsigned char *in, size_t n, uint8_t *out, size_t room)
 {
     size_t i = 0;
-    __m512i bytes;
-    for (; n - i >= 64 && room >= 64; i += 64, out += 48, room -= 48) {
-        if (!decode_block(in + i, &bytes))
+    __mmask64 outside, next;
+    // Two blocks a turn, tested together; a pair that fails is taken again
+    // one block at a time.
+    for (; n - i >= 128 && room >= 112; i += 128, out += 96, room -= 96) {
+        __m512i first = decode_values(_mm512_loadu_si512(in + i), &outside);
+        __m512i second = decode_values(_mm512_loadu_si512(in + i + 64), &next);
+        if ((outside | next) != 0)
             break;
-        _mm512_storeu_si512(out, bytes);
+        _mm512_storeu_si512(out, decode_groups(first));
+        _mm512_storeu_si512(out + 48, decode_groups(second));
     }
-    return i + decode_avx2(in + i, n - i, out, room);
+    for (; n - i >= 64 && room >= 64; i += 64, out += 48, room -= 48) {
+        __m512i values = decode_values(_mm512_loadu_si512(in + i), &outside);
+        if (outside != 0)
+            break;
+        _mm512_storeu_si512(out, decode_groups(values));
+    }
+    // Then, under masks, the whole quads before the first character outside
+    // the alphabet among the next 64 at most; the zeros past the text are
+    // outside too.
+    const __mmask64 left = n - i < 64 ? (__mmask64{1} << (n - i)) - 1 : kAll;
+    __m512i values = decode_values(_mm512_maskz_loadu_epi8(left, in + i), &outside);
+    size_t quads = (outside != 0 ? static_cast<size_t>(__builtin_ctzll(outside)) : 64) / 4;
+    quads = 3 * quads <= room ? quads : room / 3;
+    _mm512_mask_storeu_epi8(out, (__mmask64{1} << 3 * quads) - 1, decode_groups(values));
+    return i + 4 * quads;
 }
 #endif
 

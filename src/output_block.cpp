@@ -9,16 +9,21 @@ namespace zv {
 
 void *malloc_output(size_t size)
 {
-    void *block = std::malloc(size);
-    if (block == nullptr || size < kHugeOutput)
-        return block;
-    constexpr uintptr_t kHugePage = uintptr_t{2} << 20;
-    auto start = (reinterpret_cast<uintptr_t>(block) + kHugePage - 1) & ~(kHugePage - 1);
-    auto end = (reinterpret_cast<uintptr_t>(block) + size) & ~(kHugePage - 1);
-    if (end > start) {
+    if (size < kHugeOutput)
+        return std::malloc(size);
+    // Whole huge pages, so no part of the block is faulted 4 KiB at a time.
+    // glibc serves the block from its own mapping; free() unmaps it.
+    constexpr size_t kHugePage = size_t{2} << 20;
+    size_t rounded = (size + kHugePage - 1) & ~(kHugePage - 1);
+    if (rounded < size) {
+        errno = ENOMEM;
+        return nullptr;
+    }
+    void *block = std::aligned_alloc(kHugePage, rounded);
+    if (block != nullptr) {
         // Only advice: without huge pages the block works the same.
         int saved = errno;
-        ::madvise(reinterpret_cast<void *>(start), end - start, MADV_HUGEPAGE);
+        ::madvise(block, rounded, MADV_HUGEPAGE);
         errno = saved;
     }
     return block;

@@ -8,10 +8,11 @@
 
 namespace zv {
 
-// malloc(size). A block of kHugeOutput bytes or more also has its whole 2 MiB
-// pages advised for transparent huge pages, since writing it page by page
-// costs more than coding it. NULL with errno set on failure; errno is
-// otherwise left as it was.
+// malloc(size). A block of kHugeOutput bytes or more is instead 2 MiB aligned
+// and rounded up to whole 2 MiB pages, all advised for transparent huge pages,
+// since writing it page by page costs more than coding it. Either is released
+// with free(). NULL with errno set on failure; errno is otherwise left as it
+// was.
 ZV_INTERNAL void *malloc_output(size_t size);
 
 // glibc's allocator serves blocks of this size (its largest automatic mmap

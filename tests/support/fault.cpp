@@ -138,6 +138,8 @@ WRAP(malloc, void *, (size_t a), "alloc", nullptr,
      a >> 31 && HIT("alloc_huge") ? nullptr : __real_malloc(a))
 WRAP(calloc, void *, (size_t a, size_t b), "alloc", nullptr,
      a * b >> 31 && HIT("alloc_huge") ? nullptr : __real_calloc(a, b))
+WRAP(aligned_alloc, void *, (size_t a, size_t b), "alloc", nullptr,
+     b >> 31 && HIT("alloc_huge") ? nullptr : __real_aligned_alloc(a, b))
 WRAP(strndup, char *, (const char *a, size_t b), "alloc", nullptr, __real_strndup(a, b))
 // "read_idle" and "write_idle" make a call return 0 without moving a byte;
 // "write_short" moves one byte at most.
@@ -196,8 +198,7 @@ WRAP(time, time_t, (time_t *a), "time", -1,
 WRAP(localtime_r, tm *, (const time_t *a, tm *b), "localtime_r", nullptr, __real_localtime_r(a, b))
 WRAP(gmtime_r, tm *, (const time_t *a, tm *b), "gmtime_r", nullptr, __real_gmtime_r(a, b))
 WRAP(asctime_r, char *, (const tm *a, char *b), "asctime_r", nullptr, __real_asctime_r(a, b))
-// A failed ctime_r leaves 26 bytes without a terminator, the worst a caller
-// could be handed.
+// A failed ctime_r leaves 26 bytes without a terminator, the worst a caller could be handed.
 WRAP(ctime_r, char *, (const time_t *a, char *b), "ctime_r",
      (std::memset(b, '#', 26), nullptr), __real_ctime_r(a, b))
 // The open calls also note what they leave inheritable.
