@@ -17,7 +17,7 @@ namespace {
 
 static_assert(std::endian::native == std::endian::little);
 
-constexpr char kAlphabet[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+using zv::base64::kAlphabet;
 
 // The two characters for each 12-bit half of a group.
 constexpr auto kPairs = [] {

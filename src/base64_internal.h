@@ -10,6 +10,10 @@
 
 namespace zv::base64 {
 
+// The 64 characters of the text, in value order.
+inline constexpr char kAlphabet[] =
+    "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+
 // Encodes whole 12-byte (SSSE3) or 24-byte (AVX2) blocks of the |n| bytes at
 // |in|, 16 characters per 12 bytes, and returns the bytes consumed (a multiple
 // of 12; 0 below 16 bytes). The AVX-512 VBMI kernel (64-bit only) takes

@@ -117,8 +117,6 @@ ZV_TARGET("avx2") inline bool decode_lanes(__m256i in, __m256i *out)
 #ifdef __x86_64__
 #define ZV_AVX512VBMI "avx512f,avx512bw,avx512vbmi"
 
-constexpr char kAlphabet[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
-
 // Encoding: group k's bytes b0 b1 b2 (at 3k) go to word k as b1 b0 b2 b1, as
 // in the lanes above; in each 64-bit half of a word pair the values of the text
 // start at bits 10, 4, 22 and 16.
